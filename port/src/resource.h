@@ -20,6 +20,7 @@ class PortResourceAnchor_t {
 
  private:
   friend class PortResource_t;
+  friend struct PortResourceInspector_t;  // test-only view of the stack and the lists
   PortResourceAnchor_t();
   ~PortResourceAnchor_t();
   PortResourceAnchor_t(const PortResourceAnchor_t&) = delete;
@@ -46,6 +47,7 @@ class PortResource_t {
 
  private:
   friend class PortResourceAnchor_t;
+  friend struct PortResourceInspector_t;
   PortResourceAnchor_t* anchor;
   PortResource_t* prev;
   PortResource_t* next;
