@@ -16,7 +16,9 @@ class PortFileStream_t : public PortStream_t {
 
   void WriteOpen(const PortString_t& aFilename);  // "wb+": creates or truncates; code 6
   void ReadOpen(const PortString_t& aFilename);   // "rb"; code 7, also for a directory
-  void Close();                                   // harmless when nothing is open
+  // Harmless when nothing is open. When the final flush of a file open for writing fails,
+  // raises code 8 (the stream is closed but keeps naming the file); destruction closes silently.
+  void Close();
 
   int Write(const void* aPtr, int aLength) override;  // code 10 / 8; negative length: code 3
   int Read(void* aPtr, int aLength) override;         // code 11 / 9; negative length: code 3
@@ -28,6 +30,8 @@ class PortFileStream_t : public PortStream_t {
   const PortString_t& GetDescription() const override;  // the name, or "<no filename>"
 
  private:
+  bool CloseHandle();  // true when fclose reported no failure
+
   FILE* fileHandle;
   PortFilename_t filename;
 };
