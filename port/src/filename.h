@@ -33,6 +33,8 @@ class PortFilename_t {
   [[noreturn]] void Error();  // raises "'" + nakedStr + "'" + " illegal filename."
 
  private:
+  int GetExtIndex() const;  // index of the extension's dot, -1 without an extension
+
   PortString_t nakedStr;
   PortString_t filenameStr;
 };
