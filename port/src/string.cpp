@@ -445,13 +445,10 @@ unsigned int PortString_t::ToUint(bool* aErrorFlagPtr) const {
   char* end = nullptr;
   errno = 0;
   const unsigned long value = strtoul(data->p, &end, 0);
-  bool failed = end != data->p + data->length || errno != 0;
-  if (!failed && value > UINT_MAX) {
-    // strtoul negates in unsigned long; a 32-bit conversion accepts a negated magnitude up
-    // to UINT_MAX and wraps it modulo 2^32, which is the low half of the 64-bit result.
-    const unsigned long magnitude = 0UL - value;
-    failed = !(StartsNegative(data->p) && magnitude <= UINT_MAX);
-  }
+  // strtoul negates in unsigned long. A 32-bit conversion accepts a magnitude up to
+  // UINT_MAX and negates it modulo 2^32, which is the low half of the 64-bit result.
+  const unsigned long magnitude = StartsNegative(data->p) ? 0UL - value : value;
+  const bool failed = end != data->p + data->length || errno != 0 || magnitude > UINT_MAX;
   ReportConversion(failed, aErrorFlagPtr, IntConversionFailure);
   return failed ? 0U : static_cast<unsigned int>(value & UINT_MAX);
 }
