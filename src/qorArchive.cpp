@@ -1,5 +1,7 @@
 #include "src/qorArchive.h"
 
+#include <cctype>
+
 namespace {
 uint32_t Load32(const unsigned char* p) {
   return p[0] | (p[1] << 8) | (p[2] << 16) | (static_cast<uint32_t>(p[3]) << 24);
@@ -38,4 +40,25 @@ qorEndFileHeader_t::qorEndFileHeader_t() {
   fileSize = kQorHeaderSize;
   magicCode = kQorEndMagic;
   realSize = 0;
+}
+
+uint32_t QorMagicCodeOfExt(const PortString_t& aExt) {
+  const int magic_length = 4;
+  uint32_t magic = 0;
+  for (int i = 0; i < magic_length && i + 1 < aExt.GetLength(); ++i) {
+    uint32_t ch = static_cast<unsigned char>(toupper(static_cast<unsigned char>(aExt[i + 1])));
+    magic |= ch << (8 * i);
+  }
+  return magic;
+}
+
+int QorMergeModeOfExt(const PortString_t& aExt) {
+  static const struct {
+    const char* ext;
+    int mode;
+  } kModes[] = {{".PB", 1}, {".MB", 0}, {".TB", 2}, {".AB", 0}, {".TMX", 0}};
+  for (const auto& m : kModes) {
+    if (CaseCompare(aExt, m.ext) == 0) return m.mode;
+  }
+  return 3;
 }

@@ -11,6 +11,8 @@
 
 #include <cstdint>
 
+#include "port/src/string.h"
+
 const int kQorHeaderSize = 16;
 const int kQorEntryAlign = 64;
 const int kQorNameBlockMax = 48;
@@ -51,5 +53,14 @@ struct qorEndFileHeader_t : qorStdFileHeader_t {
 inline int QorPadLength(uint32_t fileSize) {
   return (kQorEntryAlign - static_cast<int>(fileSize % kQorEntryAlign)) % kQorEntryAlign;
 }
+
+// What qorLink derives from a listed file's extension (dot included, as
+// PortFilename_t::GetExtName gives it; empty without one):
+// the magic code of a plain file: the first four characters after the dot, upper-cased
+// (toupper), in file order, the remaining bytes zero;
+uint32_t QorMagicCodeOfExt(const PortString_t& aExt);
+// the merge mode, compared ignoring case: ".PB" 1 (archive), ".MB" ".AB" ".TMX" 0 (own
+// header), ".TB" 2 (raw copy), anything else 3 (plain file).
+int QorMergeModeOfExt(const PortString_t& aExt);
 
 #endif
