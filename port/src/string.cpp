@@ -63,7 +63,6 @@ bool LiesInside(const PORT_char_t* aStr, const PortStringData_t* aBody) {
 
 void PortStringData_t::Detach() {
   if (--refCount == 0 && this != &nullString) {
-    this->~PortStringData_t();
     delete[] reinterpret_cast<char*>(this);
   }
 }
@@ -393,7 +392,9 @@ PortString_t PortString_t::LabelString() const {
   const int prefix = isdigit(first) ? 1 : 0;
   const int length = SumLength(data->length, prefix);
   label.Alloc(length);
-  label.data->p[0] = '_';
+  if (prefix != 0) {
+    label.data->p[0] = '_';
+  }
   for (int i = 0; i < data->length; ++i) {
     const unsigned char ch = static_cast<unsigned char>(data->p[i]);
     label.data->p[prefix + i] = isalnum(ch) ? static_cast<PORT_char_t>(ch) : '_';

@@ -44,7 +44,7 @@ class PortString_t {
   PORT_char_t operator[](int i) const { return data->p[i]; }
 
   const PortString_t& operator=(const PortString_t& aStr);
-  const PortString_t& operator=(const PORT_char_t* aStr);  // must not point into this string
+  const PortString_t& operator=(const PORT_char_t* aStr);  // may point into this string
   const PortString_t& operator=(char aCh);
   const PortString_t& operator+=(const PortString_t& aStr);
   const PortString_t& operator+=(const PORT_char_t* aStr);  // null: no change
@@ -65,12 +65,15 @@ class PortString_t {
   PortString_t Substr(int aFrom, int aLength) const;
   PortString_t LabelString() const;
 
-  // Whole-text conversions with base 0. A null flag pointer turns a failure into a thrown
-  // const char* ("ERROR : PortString_t::ToInt" / "ERROR : PortString_t::ToFloat").
+  // Whole-text conversions with base 0 and 32-bit ranges ("-1" gives 4294967295 as unsigned).
+  // The flag is set on failure and cleared on success; a null flag pointer turns a failure
+  // into a thrown const char* ("ERROR : PortString_t::ToInt" / "ERROR : PortString_t::ToFloat").
   int ToInt(bool* aErrorFlagPtr) const;
   unsigned int ToUint(bool* aErrorFlagPtr) const;
   double ToFloat(bool* aErrorFlagPtr) const;
 
+  // printf-style. Raises code 3 when the formatter fails for a reason other than room
+  // (an argument the locale cannot encode, such as a wide character under "C").
   static PortString_t Format(const PORT_char_t* aStr, ...)
       __attribute__((format(printf, 1, 2)));
 
