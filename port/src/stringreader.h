@@ -15,8 +15,10 @@ class PortStringReader_t {
   PortStringReader_t(const PortStringReader_t&) = delete;
   PortStringReader_t& operator=(const PortStringReader_t&) = delete;
 
-  // The next line without its terminator; empty past the end. A stream that delivers fewer
-  // bytes than its measured length promised raises its " read error." (code 9).
+  // The next line without its terminator; empty past the end. Errors of the stream's Read
+  // pass through. A stream that delivers fewer bytes than its measured length promised
+  // raises its " read error." (code 9); the bytes that did arrive stay buffered, so a later
+  // call carries on where the stream stands.
   PortString_t gets();
   bool eof() const { return EndOfStream() && activeSize_ == 0; }
 
@@ -27,7 +29,7 @@ class PortStringReader_t {
     return bufferSize_ - dataTop_ < activeSize_ ? bufferSize_ - dataTop_ : activeSize_;
   }
   bool EndOfStream() const { return streamLeft_ <= 0; }
-  int ReadStream(void* ptr, int size);
+  void ReadStream(int index, int size);  // into buffer_ at index, counted in activeSize_
   void ExpandBuffer();
   void FillBuffer();
 
