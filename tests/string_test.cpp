@@ -2,6 +2,7 @@
 
 #include <climits>
 #include <cstring>
+#include <initializer_list>
 #include <string>
 #include <vector>
 
@@ -202,6 +203,7 @@ TEST(PortString, Comparison) {
   EXPECT_EQ(0, CaseCompare(PortString_t("ID=7"), PortString_t("id="), 3));
   EXPECT_NE(0, CaseCompare(PortString_t("ID=7"), PortString_t("id="), 4));
   EXPECT_EQ(0, Compare(PortString_t("abX"), PortString_t("abY"), 2));
+  EXPECT_EQ(0, Compare(PortString_t("a"), PortString_t("b"), -1));  // no characters compared
   EXPECT_GT(Compare(PortString_t("\x80"), PortString_t("a")), 0);  // bytes are unsigned
 
   const PortString_t nul1("ab\0x", 4);
@@ -261,64 +263,48 @@ TEST(PortString, LabelString) {
   }
 }
 
-TEST(PortString, ToInt) {
-  const struct {
-    const char* text;
-    int value;
-    bool error;
-  } cases[] = {
-      {"0x1A", 26, false},         {"0X1a", 26, false},          {"010", 8, false},
-      {" 12", 12, false},          {"", 0, false},               {"-2147483648", INT_MIN, false},
-      {"2147483647", INT_MAX, false}, {"12 ", 0, true},          {"08", 0, true},
-      {"1.5", 0, true},            {"2147483648", 0, true},      {"-2147483649", 0, true},
-      {"0xFFFFFFFF", 0, true},     {"abc", 0, true},
-  };
-  for (const auto& c : cases) {
+template <typename T>
+struct Conversion {
+  const char* text;
+  T value;
+  bool error;
+};
+
+template <typename T>
+void CheckConversions(T (PortString_t::*aConvert)(bool*) const,
+                      std::initializer_list<Conversion<T>> aCases) {
+  for (const auto& c : aCases) {
     bool error = !c.error;
-    EXPECT_EQ(c.value, PortString_t(c.text).ToInt(&error)) << c.text;
+    EXPECT_EQ(c.value, (PortString_t(c.text).*aConvert)(&error)) << c.text;
     EXPECT_EQ(c.error, error) << c.text;
   }
+}
+
+TEST(PortString, NumberConversion) {
+  CheckConversions<int>(&PortString_t::ToInt,
+                        {{"0x1A", 26, false}, {"0X1a", 26, false}, {"010", 8, false},
+                         {" 12", 12, false}, {"", 0, false}, {"-2147483648", INT_MIN, false},
+                         {"2147483647", INT_MAX, false}, {"12 ", 0, true}, {"08", 0, true},
+                         {"1.5", 0, true}, {"2147483648", 0, true}, {"-2147483649", 0, true},
+                         {"0xFFFFFFFF", 0, true}, {"abc", 0, true}});
+  CheckConversions<unsigned int>(
+      &PortString_t::ToUint,
+      {{"4294967295", 4294967295u, false}, {"-1", 4294967295u, false},
+       {"-4294967295", 1u, false}, {"0xffffffff", 4294967295u, false}, {"-0", 0u, false},
+       {"4294967296", 0u, true}, {"-4294967296", 0u, true}, {"18446744073709551615", 0u, true},
+       {"-18446744073709551615", 0u, true}, {"99999999999999999999", 0u, true}});
+  CheckConversions<double>(&PortString_t::ToFloat,
+                           {{"1.5", 1.5, false}, {"-2e3", -2000.0, false}, {"", 0.0, false},
+                            {"1e400", 0.0, true}, {"1.5x", 0.0, true}});
+
+  // The whole text must convert, a NUL inside it included.
   bool error = false;
   EXPECT_EQ(0, PortString_t("12\0" "3", 4).ToInt(&error));
   EXPECT_TRUE(error);
-  EXPECT_EQ("ERROR : PortString_t::ToInt", Thrown([] { PortString_t("x").ToInt(nullptr); }));
+
   EXPECT_EQ(-7, PortString_t("-7").ToInt(nullptr));
-}
-
-TEST(PortString, ToUint) {
-  const struct {
-    const char* text;
-    unsigned int value;
-    bool error;
-  } cases[] = {
-      {"4294967295", 4294967295u, false},  {"-1", 4294967295u, false},
-      {"-4294967295", 1u, false},          {"0xffffffff", 4294967295u, false},
-      {"-0", 0u, false},                   {"4294967296", 0u, true},
-      {"-4294967296", 0u, true},           {"18446744073709551615", 0u, true},
-      {"-18446744073709551615", 0u, true}, {"99999999999999999999", 0u, true},
-  };
-  for (const auto& c : cases) {
-    bool error = !c.error;
-    EXPECT_EQ(c.value, PortString_t(c.text).ToUint(&error)) << c.text;
-    EXPECT_EQ(c.error, error) << c.text;
-  }
+  EXPECT_EQ("ERROR : PortString_t::ToInt", Thrown([] { PortString_t("x").ToInt(nullptr); }));
   EXPECT_EQ("ERROR : PortString_t::ToInt", Thrown([] { PortString_t("-").ToUint(nullptr); }));
-}
-
-TEST(PortString, ToFloat) {
-  const struct {
-    const char* text;
-    double value;
-    bool error;
-  } cases[] = {
-      {"1.5", 1.5, false}, {"-2e3", -2000.0, false}, {"", 0.0, false},
-      {"1e400", 0.0, true}, {"1.5x", 0.0, true},
-  };
-  for (const auto& c : cases) {
-    bool error = !c.error;
-    EXPECT_EQ(c.value, PortString_t(c.text).ToFloat(&error)) << c.text;
-    EXPECT_EQ(c.error, error) << c.text;
-  }
   EXPECT_EQ("ERROR : PortString_t::ToFloat",
             Thrown([] { PortString_t("1e400").ToFloat(nullptr); }));
 }
