@@ -131,6 +131,7 @@ TEST_F(Resource, NestedAnchorOwnsOnlyLaterResources) {
   EXPECT_EQ(Inspect::Current(), root);
   EXPECT_EQ(Inspect::Next(root), nullptr);
   EXPECT_EQ(Inspect::List(root), (std::vector<const PortResource_t*>{x}));
+  delete x;  // before its log goes out of scope
 }
 
 TEST_F(Resource, EndingAnAnchorEndsItsInnerAnchorsFirst) {
