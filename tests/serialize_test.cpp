@@ -1,0 +1,416 @@
+#include "port/src/serialize.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <cstring>
+#include <functional>
+#include <memory>
+#include <new>
+#include <string>
+#include <vector>
+
+#include "tests/support/raisedtext.h"
+#include "tests/support/teststream.h"
+
+namespace {
+
+const char kReadError[] = "<test stream> read error.";
+const char kInvalidFormat[] = " invalid file format.";
+
+std::string Hex(const std::string& aBytes) {
+  std::string out;
+  char cell[4];
+  for (unsigned char c : aBytes) {
+    snprintf(cell, sizeof cell, out.empty() ? "%02X" : " %02X", c);
+    out += cell;
+  }
+  return out;
+}
+
+// 32-bit little-endian words, the layout of IDs, counts and tags.
+std::string Words(std::initializer_list<int32_t> aWords) {
+  std::string out;
+  for (int32_t w : aWords) out.append(reinterpret_cast<const char*>(&w), 4);
+  return out;
+}
+
+// Exposes the registry's size and buckets.
+struct RegistryView : PortSerializeReader_t {
+  int Count() const { return ptrList.GetCount(); }
+  int Capacity() const { return ptrList.GetCapacity(); }
+  int Bucket(int aKey) const { return hashIdx[aKey]; }
+  using PortSerialize_t::AddPtr;
+};
+
+struct Node {
+  int32_t value = 0;
+  char label[8] = {};
+  Node* next = nullptr;
+  Node* other = nullptr;
+};
+
+// The graph is written node by node; a node's pointers may name nodes defined later.
+void WriteGraph(PortSerializeWriter_t& aWriter, const std::vector<Node*>& aNodes) {
+  aWriter.Write(static_cast<int>(aNodes.size()));
+  for (Node* n : aNodes) {
+    aWriter.WritePtrID(n, nullptr);
+    aWriter.Write(n->value);
+    aWriter.Write(n->label);
+    aWriter.WritePtr(n->next);
+    aWriter.WritePtr(n->other);
+  }
+}
+
+std::vector<std::unique_ptr<Node>> ReadGraph(PortSerializeReader_t& aReader) {
+  std::vector<std::unique_ptr<Node>> nodes;
+  int count;
+  aReader.Read(count);
+  for (int i = 0; i < count; ++i) {
+    nodes.emplace_back(new Node);
+    Node* n = nodes.back().get();
+    aReader.ReadRegistPtr(n);
+    aReader.Read(n->value);
+    aReader.Read(n->label, sizeof n->label);
+    aReader.ReadPtr(&n->next);
+    aReader.ReadPtr(&n->other);
+  }
+  return nodes;
+}
+
+// A cycle a->b->c->a, c shared by a and b, d pointing at itself, null pointers, and
+// references to b, c and d written before their definitions.
+struct Graph {
+  Node a, b, c, d;
+  std::vector<Node*> order{&a, &b, &c, &d};
+  Graph() {
+    a = {1, "a", &b, &c};
+    b = {2, "bee", &c, nullptr};
+    c = {3, "", &a, &d};
+    d = {4, "dd", &d, nullptr};
+  }
+  std::string Stream() {
+    TestStream_t strm;
+    PortSerializeWriter_t writer;
+    writer.SetStream(&strm);
+    WriteGraph(writer, order);
+    EXPECT_EQ(writer.GetUnresolveCount(), 0);
+    return strm.Content();
+  }
+};
+
+}  // namespace
+
+TEST(SerializeWriter, GivesIdsInOrderOfFirstMeeting) {
+  TestStream_t strm;
+  PortSerializeWriter_t w;
+  w.SetStream(&strm);
+  int a, b, c;
+  PortSerializePtrID_t id = -7;
+  struct Step {
+    std::function<int()> op;
+    int result;
+    const char* bytes;
+    int unresolved;
+  } steps[] = {
+      {[&] { return w.WritePtr(nullptr); }, 0, "00 00 00 00", 0},
+      {[&] { return w.WritePtr(&a); }, 0, "01 00 00 00", 1},
+      {[&] { return w.WritePtr(&a); }, 0, "01 00 00 00", 1},
+      {[&] { return w.WritePtrID(&b, &id); }, 0, "02 00 00 00", 1},
+      {[&] { return w.WritePtrID(&a, &id); }, 0, "01 00 00 00", 0},
+      {[&] { return w.WritePtrID(&a, &id); }, 1, "", 0},
+      {[&] { return w.WritePtr(&c); }, 0, "03 00 00 00", 1},
+      {[&] { return w.WritePtrID(nullptr, &id); }, 0, "00 00 00 00", 1},
+  };
+  for (size_t i = 0; i < sizeof steps / sizeof steps[0]; ++i) {
+    SCOPED_TRACE(i);
+    size_t before = strm.Content().size();
+    EXPECT_EQ(steps[i].op(), steps[i].result);
+    EXPECT_EQ(Hex(strm.Content().substr(before)), steps[i].bytes);
+    EXPECT_EQ(w.GetUnresolveCount(), steps[i].unresolved);
+  }
+  EXPECT_EQ(id, 0);
+  EXPECT_EQ(RaisedText([&] { w.Term(); }), " program error.");
+  EXPECT_EQ(w.SearchPtrID(&b), 2);
+  EXPECT_EQ(w.SearchPtrID(nullptr), 0);
+  EXPECT_EQ(w.SearchPtrID(&id), -1);
+}
+
+TEST(Serialize, HashesBitsTwoToSeventeenOfTheLow32Bits) {
+  RegistryView v;
+  struct Case {
+    uintptr_t address;
+    int bucket;
+  } cases[] = {{0x4, 0x01}, {0x400, 0x01}, {0x3FC, 0xFF}, {0x12345678, 0x9F},
+               {static_cast<uintptr_t>(0x7FFF00000010ULL), 0x04}};
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.address);
+    const void* p = reinterpret_cast<const void*>(c.address);
+    PortSerializePtrID_t id = v.AddPtr(p);
+    EXPECT_EQ(v.Bucket(c.bucket), id);
+    EXPECT_EQ(v.SearchPtrID(p), id);
+  }
+  EXPECT_EQ(v.SearchPtrID(reinterpret_cast<const void*>(0x4)), 1);  // behind 0x400 in its bucket
+  EXPECT_EQ(v.Bucket(0), 0);
+}
+
+TEST(SerializeWriter, WritesValuesAndTextsInTheirLayouts) {
+  int a, b;
+  struct Case {
+    const char* name;
+    std::function<void(PortSerializeWriter_t&)> op;
+    const char* bytes;
+  } cases[] = {
+      {"text abc", [](PortSerializeWriter_t& w) { w.Write("abc"); }, "03 00 00 00 61 62 63"},
+      {"empty text", [](PortSerializeWriter_t& w) { w.Write(""); }, "00 00 00 00"},
+      {"unsigned char", [](PortSerializeWriter_t& w) { w.Write((unsigned char)0xAB); }, "AB"},
+      {"short", [](PortSerializeWriter_t& w) { w.Write((short)-2); }, "FE FF"},
+      {"unsigned int", [](PortSerializeWriter_t& w) { w.Write(0x01020304u); }, "04 03 02 01"},
+      {"long", [](PortSerializeWriter_t& w) { w.Write(-2L); }, "FE FF FF FF"},
+      {"unsigned long", [](PortSerializeWriter_t& w) { w.Write(0xFFFFFFFFUL); }, "FF FF FF FF"},
+      {"float", [](PortSerializeWriter_t& w) { w.Write(1.0f); }, "00 00 80 3F"},
+      {"double", [](PortSerializeWriter_t& w) { w.Write(-2.0); }, "00 00 00 00 00 00 00 C0"},
+      {"string", [](PortSerializeWriter_t& w) { PortString_t("ab").Write(w); },
+       "02 00 00 00 02 00 00 00 61 62"},
+      {"header example",
+       [&](PortSerializeWriter_t& w) {
+         w.WritePtr(&b);
+         w.WritePtrID(&a, nullptr);
+         w.WritePtrID(&b, nullptr);
+         w.Write("hi");
+       },
+       "01 00 00 00 02 00 00 00 01 00 00 00 02 00 00 00 68 69"},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.name);
+    TestStream_t strm;
+    PortSerializeWriter_t w;
+    w.SetStream(&strm);
+    c.op(w);
+    EXPECT_EQ(Hex(strm.Content()), c.bytes);
+  }
+}
+
+TEST(SerializeWriter, RefusesWhatTheLayoutCannotHold) {
+  TestStream_t strm;
+  PortSerializeWriter_t w;
+  EXPECT_EQ(RaisedText([&] { w.Write(1); }), " file operation invalid.");
+  w.SetStream(&strm);
+  EXPECT_EQ(RaisedText([&] { w.Write(0x100000000L); }), " illegal parameter.");
+  EXPECT_EQ(RaisedText([&] { w.Write(-0x80000001L); }), " illegal parameter.");
+  EXPECT_EQ(RaisedText([&] { w.Write(0x100000000UL); }), " illegal parameter.");
+  EXPECT_EQ(strm.Content(), "");
+  PortSerializeReader_t r;
+  int v;
+  EXPECT_EQ(RaisedText([&] { r.Read(v); }), " file operation invalid.");
+}
+
+TEST(SerializeReader, ReadsNarrowedLongsBack) {
+  TestStream_t strm(Words({-2, -2}));
+  PortSerializeReader_t r;
+  r.SetStream(&strm);
+  long l;
+  unsigned long ul;
+  r.Read(l);
+  r.Read(ul);
+  EXPECT_EQ(l, -2L);
+  EXPECT_EQ(ul, 0xFFFFFFFEUL);
+}
+
+TEST(Serialize, TagsFollowTheVerboseBit) {
+  const PortFourcc_t tag = 0x54534554;  // "TEST"
+  for (int flag : {0, PortSerialize_t::kVerbose}) {
+    SCOPED_TRACE(flag);
+    TestStream_t strm;
+    PortSerializeWriter_t w;
+    w.SetStream(&strm);
+    w.SetFlag(flag);
+    w.WriteFourcc(tag, true);
+    w.WriteFourcc(tag, false);
+    EXPECT_EQ(strm.Content(), flag ? "TESTTEST" : "TEST");
+
+    strm.Seek(0, 0);
+    PortSerializeReader_t r;
+    r.SetStream(&strm);
+    r.SetFlag(flag);
+    r.CheckFourcc(tag, true);
+    EXPECT_EQ(strm.GetPosition(), flag ? 4 : 0);
+    r.CheckFourcc(tag, false);
+    EXPECT_EQ(strm.GetPosition(), flag ? 8 : 4);
+  }
+}
+
+TEST(SerializeReader, TextReadCutsLongTextsAndSkipsTheirRest) {
+  TestStream_t strm(Words({3}) + "abc" + Words({0}) + Words({6}) + "abcdef" + Words({42}));
+  PortSerializeReader_t r;
+  r.SetStream(&strm);
+  char buf[8];
+  memset(buf, 'x', sizeof buf);
+  r.Read(buf, 8);
+  EXPECT_STREQ(buf, "abc");
+  EXPECT_EQ(strm.GetPosition(), 7);
+  r.Read(buf, 8);  // the empty text leaves the buffer as it was
+  EXPECT_STREQ(buf, "abc");
+  EXPECT_EQ(strm.GetPosition(), 11);
+  r.Read(buf, 4);
+  EXPECT_STREQ(buf, "abc");
+  int after;
+  r.Read(after);
+  EXPECT_EQ(after, 42);
+}
+
+TEST(SerializeReader, WaitingVariablesChainUntilTheirObjectIsRegistered) {
+  TestStream_t strm(Words({1, 1, 1, 1, 1}));
+  PortSerializeReader_t r;
+  r.SetStream(&strm);
+  void* first = &strm;
+  void* second = &strm;
+  void* later = nullptr;
+  int obj, other;
+  r.ReadPtr(&first);
+  r.ReadPtr(&second);
+  EXPECT_EQ(first, nullptr);
+  EXPECT_EQ(second, &first);
+  r.ReadRegistPtr(&obj);
+  EXPECT_EQ(first, &obj);
+  EXPECT_EQ(second, &obj);
+  r.ReadPtr(&later);  // already registered: the address at once
+  EXPECT_EQ(later, &obj);
+  r.ReadRegistPtr(&other);  // the first registration stands
+  r.RegistPtr(0, &other);   // ID 0 stays null
+  EXPECT_EQ(r.SearchPtrID(&obj), 1);
+  EXPECT_EQ(r.SearchPtrID(&other), -1);
+  r.Term();
+}
+
+TEST(SerializeReader, TermNullsVariablesStillWaiting) {
+  TestStream_t strm(Words({2, 2}));
+  PortSerializeReader_t r;
+  r.SetStream(&strm);
+  void* a;
+  void* b;
+  r.ReadPtr(&a);
+  r.ReadPtr(&b);
+  EXPECT_EQ(b, &a);
+  EXPECT_EQ(RaisedText([&] { r.Term(); }), kInvalidFormat);
+  EXPECT_EQ(a, nullptr);
+  EXPECT_EQ(b, nullptr);
+}
+
+TEST(Serialize, RoundTripRebuildsThePointerGraph) {
+  Graph g;
+  TestStream_t strm(g.Stream());
+  PortSerializeReader_t r;
+  r.SetStream(&strm);
+  std::vector<std::unique_ptr<Node>> nodes = ReadGraph(r);
+  r.Term();
+  ASSERT_EQ(nodes.size(), 4u);
+  EXPECT_EQ(strm.GetPosition(), strm.GetLength());
+  auto rebuilt = [&](const Node* original) -> Node* {
+    for (size_t i = 0; i < g.order.size(); ++i) {
+      if (g.order[i] == original) return nodes[i].get();
+    }
+    return nullptr;
+  };
+  for (size_t i = 0; i < nodes.size(); ++i) {
+    SCOPED_TRACE(i);
+    EXPECT_EQ(nodes[i]->value, g.order[i]->value);
+    EXPECT_STREQ(nodes[i]->label, g.order[i]->label);
+    EXPECT_EQ(nodes[i]->next, rebuilt(g.order[i]->next));
+    EXPECT_EQ(nodes[i]->other, rebuilt(g.order[i]->other));
+  }
+  EXPECT_EQ(nodes[0]->next->next->next, nodes[0].get());
+  EXPECT_EQ(nodes[3]->next, nodes[3].get());
+}
+
+TEST(SerializeReader, EveryTruncationOfAGraphRaisesReadError) {
+  Graph g;
+  const std::string full = g.Stream();
+  for (size_t len = 0; len < full.size(); ++len) {
+    SCOPED_TRACE(len);
+    TestStream_t strm(full.substr(0, len));
+    PortSerializeReader_t r;
+    r.SetStream(&strm);
+    EXPECT_EQ(RaisedText([&] { ReadGraph(r); }), kReadError);
+  }
+}
+
+TEST(SerializeReader, StringsComeBackThroughReadAndRejectImpossibleLengths) {
+  for (const char* text : {"", "a", "hello world", "0123456789abcdef0123456789abcdef!"}) {
+    TestStream_t strm;
+    PortSerializeWriter_t w;
+    w.SetStream(&strm);
+    PortString_t(text).Write(w);
+    strm.Seek(0, 0);
+    PortSerializeReader_t r;
+    r.SetStream(&strm);
+    PortString_t back("previous");
+    back.Read(r);
+    EXPECT_EQ(back, text);
+  }
+
+  // Cut inside a record: a length field beyond the bytes left is a format error, a cut
+  // anywhere else a read error; either way the string is left empty.
+  const std::string full = Words({5, 5}) + "hello";
+  for (size_t len = 0; len < full.size(); ++len) {
+    SCOPED_TRACE(len);
+    TestStream_t strm(full.substr(0, len));
+    PortSerializeReader_t r;
+    r.SetStream(&strm);
+    PortString_t back("previous");
+    bool length_impossible = len >= 4 && len - 4 < 5;
+    EXPECT_EQ(RaisedText([&] { back.Read(r); }), length_impossible ? kInvalidFormat : kReadError);
+    EXPECT_EQ(back, "");
+  }
+  TestStream_t negative(Words({-1, 0}));
+  PortSerializeReader_t r;
+  r.SetStream(&negative);
+  PortString_t back;
+  EXPECT_EQ(RaisedText([&] { back.Read(r); }), kInvalidFormat);
+}
+
+TEST(SerializeReader, RejectsNegativeIdsAndWrongTags) {
+  struct Case {
+    const char* name;
+    std::function<void(PortSerializeReader_t&)> op;
+  } cases[] = {
+      {"ReadPtr", [](PortSerializeReader_t& r) { void* p; r.ReadPtr(&p); }},
+      {"ReadRegistPtr", [](PortSerializeReader_t& r) { int o = 0; r.ReadRegistPtr(&o); }},
+      {"RegistPtr", [](PortSerializeReader_t& r) { int o = 0; r.RegistPtr(-1, &o); }},
+      {"CheckFourcc", [](PortSerializeReader_t& r) { r.CheckFourcc(0xFFFFFFFE, false); }},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.name);
+    TestStream_t strm(Words({-1}));
+    PortSerializeReader_t r;
+    r.SetStream(&strm);
+    EXPECT_EQ(RaisedText([&] { c.op(r); }), kInvalidFormat);
+  }
+}
+
+TEST(SerializeReader, FarIdsGrowTheRegistryOnceOrAreRefused) {
+  const int32_t far = 1000000;
+  // Long enough to have given out that many IDs: the registry reaches it in one step.
+  TestStream_t big(Words({far, far}) + std::string(4 * far, '\0'));
+  RegistryView r;
+  r.SetStream(&big);
+  void* p = &r;
+  r.ReadPtr(&p);
+  EXPECT_EQ(p, nullptr);
+  EXPECT_EQ(r.Count(), far + 1);
+  EXPECT_EQ(r.Capacity(), 1000032);
+  int obj;
+  r.ReadRegistPtr(&obj);
+  EXPECT_EQ(p, &obj);
+
+  for (int32_t id : {far, INT32_MAX}) {
+    SCOPED_TRACE(id);
+    TestStream_t small(Words({id}));
+    RegistryView s;
+    s.SetStream(&small);
+    EXPECT_EQ(RaisedText([&] { s.ReadPtr(&p); }), kInvalidFormat);
+    EXPECT_EQ(s.Count(), 1);
+  }
+  RegistryView unbound;  // no stream to bound it: the allocator's failure, not a crash
+  EXPECT_THROW(unbound.RegistPtr(INT32_MAX, &obj), std::bad_alloc);
+}
