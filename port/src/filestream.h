@@ -14,6 +14,8 @@ class PortFileStream_t : public PortStream_t {
   PortFileStream_t();
   virtual ~PortFileStream_t();
 
+  // Both first Close() the open file. A failed open leaves the stream closed but naming the
+  // file, so later failures still say which file it was.
   void WriteOpen(const PortString_t& aFilename);  // "wb+": creates or truncates; code 6
   void ReadOpen(const PortString_t& aFilename);   // "rb"; code 7, also for a directory
   // Harmless when nothing is open. When the final flush of a file open for writing fails,

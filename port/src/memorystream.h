@@ -21,7 +21,9 @@ class PortMemoryStream_t : public PortStream_t {
   PortMemoryStream_t();
   virtual ~PortMemoryStream_t();
 
-  int Write(const void* aPtr, int aLength) override;  // negative length: code 3
+  // Always stores all aLength bytes. Code 3 for a negative length or one that would take
+  // the stream past 2^31 - 1 bytes, raised before anything changes.
+  int Write(const void* aPtr, int aLength) override;
   int Read(void* aPtr, int aLength) override;         // negative length: code 3
   // Origin 2 counts backwards from the end. A target outside 0..length raises " illegal
   // parameter." (code 3, without description) and changes nothing.
@@ -33,7 +35,8 @@ class PortMemoryStream_t : public PortStream_t {
   void Free();                  // back to the state of a new stream
   void ConvertToSingleChunk();  // merges all chunks; the position becomes 0
   // The byte at the position inside one contiguous block (merging first, which moves the
-  // position to 0); null without chunks. Valid until the stream grows, merges or frees.
+  // position to 0); null without chunks or when the merge leaves none (length 0). Valid
+  // until the stream grows, merges or frees.
   void* GetPtr();
 
  private:
