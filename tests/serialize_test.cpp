@@ -388,6 +388,25 @@ TEST(SerializeReader, RejectsNegativeIdsAndWrongTags) {
   }
 }
 
+TEST(SerializeReader, RegistryGrowsGeometricallyAsNewIdsArrive) {
+  const int n = 10000;
+  std::string ids;
+  for (int32_t id = 1; id <= n; ++id) ids += Words({id});
+  TestStream_t strm(ids);
+  RegistryView r;
+  r.SetStream(&strm);
+  std::vector<void*> vars(n);
+  std::vector<int> capacities{r.Capacity()};
+  for (void*& v : vars) {
+    r.ReadPtr(&v);
+    if (r.Capacity() != capacities.back()) capacities.push_back(r.Capacity());
+  }
+  EXPECT_EQ(r.Count(), n + 1);
+  // 32 at a time would copy the registry n / 32 times: quadratic in the stream's length.
+  EXPECT_LE(capacities.size(), 20u);
+  for (int c : capacities) EXPECT_EQ(c % 32, 0) << c;
+}
+
 TEST(SerializeReader, FarIdsGrowTheRegistryOnceOrAreRefused) {
   const int32_t far = 1000000;
   // Long enough to have given out that many IDs: the registry reaches it in one step.

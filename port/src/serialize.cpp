@@ -67,6 +67,12 @@ void PortSerialize_t::SetPtr(int aId, const void* aPtr) {
 
 PortSerializePtrID_t PortSerialize_t::AddPtr(const void* aPtr) {
   PortSerializePtrID_t id = ptrList.GetCount();
+  // Still whole steps of 32, but about half the size again each time: one step per 32
+  // entries would copy the registry over and over, quadratic in the number of pointers
+  // (and so in the length of a stream being read).
+  if (id == ptrList.GetCapacity() && !ptrList.GrowFor(static_cast<int64_t>(id) + id / 2 + 1)) {
+    throw std::bad_alloc();
+  }
   ptrList.Add();
   SetPtr(id, aPtr);
   return id;
@@ -202,10 +208,10 @@ void PortSerializeReader_t::ExtendTo(PortSerializePtrID_t aId) {
   if (aId < 0) Error(kInvalidFormat);
   int count = ptrList.GetCount();
   if (aId < count) return;
-  if (aId > count && strm != nullptr && aId > strm->GetLength() / kIdBytes) {
-    Error(kInvalidFormat);
+  if (aId > count) {
+    if (strm != nullptr && aId > strm->GetLength() / kIdBytes) Error(kInvalidFormat);
+    if (!ptrList.GrowFor(static_cast<int64_t>(aId) + 1)) throw std::bad_alloc();
   }
-  if (!ptrList.GrowFor(static_cast<int64_t>(aId) + 1)) throw std::bad_alloc();
   while (ptrList.GetCount() <= aId) AddPtr(nullptr);
 }
 
