@@ -6,6 +6,8 @@
 
 #include "port/src/stream.h"
 
+class qorMatchFinder_t;
+
 class qorCompressor_t {
  public:
   qorCompressor_t();
@@ -18,7 +20,41 @@ class qorCompressor_t {
   // compressor stays usable.
   void compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int length);
 
-  // (private members are the implementer's; see qorCompress.cpp)
+ private:
+  qorCompressor_t(const qorCompressor_t&) = delete;
+  qorCompressor_t& operator=(const qorCompressor_t&) = delete;
+
+  void refill(PortStream_t& srcStrm);
+  void step();
+  int runLeng();
+  int getZeroLeng();
+  int getRleLeng();
+  int getSdLeng(int minLeng);  // only matches of at least minLeng bytes count
+  int getWordLeng();
+  void putData(unsigned char d);
+  void putDirective(unsigned char directive, int leng);
+  void putBuff(const void* buff, int leng);
+  void flushDstBuff();
+  void flushNormalData();
+
+  unsigned char dstBuffer_[4096];
+  int dstIndex_;
+  PortStream_t* dstStrm_;
+  unsigned char* buffer_;
+  int srcIndex_;
+  int srcLimit_;
+  int srcRemain_;
+  int normalIndex_;
+  int sdOffset_;
+  // What the fast search adds. Source offsets are absolute: window position + srcBase_.
+  qorMatchFinder_t* finder_;
+  int srcBase_;     // source bytes dropped from the window's front so far
+  int runFrom_;     // [runFrom_, runEnd_): bytes known equal
+  int runEnd_;
+  bool runOpen_;    // the run may go on past runEnd_
+  int wordFrom_;    // start of the last word walk; its stop is wordEnd_
+  int wordEnd_;
+  int wordLimit_;   // the window's end, absolute, when the walk stopped there; else -1
 };
 
 class qorExpander_t {

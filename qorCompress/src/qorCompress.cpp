@@ -1,0 +1,299 @@
+#include "qorCompress/src/qorCompress.h"
+
+#include <cstring>
+
+#include "qorCompress/src/qorMatchFinder.h"
+
+namespace {
+
+const int kDstSize = 4096;
+const int kWindowSize = 0x20000;
+const int kRefillAt = 0xFFFF;
+const int kHistory = 0x2000;
+const int kMaxMatch = 0x800;
+const int kNearMax = 0xFF;
+const int kShortMax = 0x1F;
+const int kMaxNormal = 0xE000;
+const int kMaxRun = 0xFFFF;        // zero and rle runs in bytes, word runs in units
+const int kMaxWordBytes = 2 * kMaxRun;
+const int kRunProbe = 0x10000;     // runs are measured this far at most: past every limit
+
+const unsigned char kNormal = 0x00;
+const unsigned char kZero = 0x20;
+const unsigned char kRle = 0x40;
+const unsigned char kNearSd = 0x60;
+const unsigned char kFarSd = 0x80;
+const unsigned char kWord = 0xA0;
+const unsigned char kEndMark = 0xFF;
+
+enum Kind_t { kNone, kKindZero, kKindRle, kKindSd, kKindWord };
+
+inline int zeroScore(int aLeng) { return aLeng <= kShortMax ? aLeng - 1 : aLeng - 2; }
+inline int rleScore(int aLeng) { return aLeng <= kShortMax ? aLeng - 2 : aLeng - 3; }
+inline int sdScore(int aLeng) { return aLeng <= kShortMax ? aLeng - 2 : aLeng - 3; }
+inline int wordScore(int aUnits) { return aUnits <= kShortMax + 1 ? aUnits - 1 : aUnits - 2; }
+
+// The shortest sd match that, at a near offset, scores above aBeat and at least aReach.
+inline int minSdLeng(int aBeat, int aReach) {
+  const int target = aBeat + 1 > aReach ? aBeat + 1 : aReach;
+  return target + 2 <= kShortMax ? target + 2 : target + 3;
+}
+
+// Frees the window however compress() ends, so that an error passes out unchanged and the
+// compressor can serve the next call.
+struct WindowRelease_t {
+  unsigned char*& window;
+  PortStream_t*& dst;
+  qorMatchFinder_t*& finder;
+  ~WindowRelease_t() {
+    delete[] window;
+    window = nullptr;
+    dst = nullptr;
+    finder = nullptr;
+  }
+};
+
+}  // namespace
+
+qorCompressor_t::qorCompressor_t() : dstStrm_(nullptr), buffer_(nullptr), finder_(nullptr) {}
+
+qorCompressor_t::~qorCompressor_t() {}
+
+void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int length) {
+  if (length <= 0) return;
+  dstStrm_ = &dstStrm;
+  const int window_size = length < kWindowSize ? length : kWindowSize;
+  buffer_ = new unsigned char[window_size];
+  WindowRelease_t release{buffer_, dstStrm_, finder_};
+  srcStrm.ReadBuffer(buffer_, window_size);
+  srcLimit_ = window_size;
+  srcIndex_ = 0;
+  srcRemain_ = length - window_size;
+  dstIndex_ = 0;
+  normalIndex_ = 0;
+  sdOffset_ = 0;
+  srcBase_ = 0;
+  runFrom_ = runEnd_ = 0;
+  runOpen_ = false;
+  wordFrom_ = wordEnd_ = 0;
+  wordLimit_ = -1;
+  qorMatchFinder_t finder(length);
+  finder_ = &finder;
+  finder.setWindow(buffer_, srcBase_, srcLimit_);
+
+  for (;;) {
+    if (srcRemain_ > 0 && srcLimit_ - srcIndex_ <= kRefillAt) {
+      refill(srcStrm);
+      finder.setWindow(buffer_, srcBase_, srcLimit_);
+    } else if (srcRemain_ == 0 && srcIndex_ == srcLimit_) {
+      break;
+    }
+    // Steps until the next refill point cannot change the window.
+    const int stop = srcRemain_ > 0 ? srcLimit_ - kRefillAt : srcLimit_;
+    do step(); while (srcIndex_ < stop);
+  }
+  flushNormalData();
+  putData(kEndMark);
+  flushDstBuff();
+}
+
+void qorCompressor_t::refill(PortStream_t& srcStrm) {
+  // Keep 8192 bytes of history for the search, and every pending normal byte.
+  const int drop = srcIndex_ - kHistory < normalIndex_ ? srcIndex_ - kHistory : normalIndex_;
+  std::memmove(buffer_, buffer_ + drop, srcLimit_ - drop);
+  srcLimit_ -= drop;
+  srcIndex_ -= drop;
+  normalIndex_ -= drop;
+  srcBase_ += drop;
+  const int count = kWindowSize - srcLimit_ < srcRemain_ ? kWindowSize - srcLimit_ : srcRemain_;
+  srcStrm.ReadBuffer(buffer_ + srcLimit_, count);
+  srcLimit_ += count;
+  srcRemain_ -= count;
+}
+
+void qorCompressor_t::step() {
+  int best = 0;
+  Kind_t kind = kNone;
+  const int zero = getZeroLeng();
+  if (zero > 0) {
+    best = zeroScore(zero);
+    kind = kKindZero;
+  }
+  const int rle = getRleLeng();
+  if (rle > 0 && rleScore(rle) > best) {
+    best = rleScore(rle);
+    kind = kKindRle;
+  }
+  // The word candidate is measured before the search: a match that cannot reach its score
+  // loses to it, so the search need not look for one.
+  const int word = getWordLeng();
+  const int word_score = word > 0 ? wordScore(word / 2) : 0;
+  const int sd = getSdLeng(minSdLeng(best, word_score));
+  if (sd > 0) {
+    int score = sdScore(sd);
+    if (sdOffset_ > kNearMax) --score;
+    if (score > best) {
+      best = score;
+      kind = kKindSd;
+    }
+  }
+  if (word > 0 && word_score > best) kind = kKindWord;
+
+  if (kind == kNone) {
+    ++srcIndex_;
+    if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
+    return;
+  }
+  flushNormalData();
+  const unsigned char* cur = buffer_ + srcIndex_;
+  int covered;
+  switch (kind) {
+    case kKindZero:
+      putDirective(kZero, zero);
+      covered = zero;
+      break;
+    case kKindRle:
+      putDirective(kRle, rle);
+      putData(cur[0]);
+      covered = rle;
+      break;
+    case kKindSd:
+      if (sdOffset_ > kNearMax) {
+        putDirective(kFarSd, sd);
+        putData(static_cast<unsigned char>(sdOffset_));
+        putData(static_cast<unsigned char>(sdOffset_ >> 8));
+      } else {
+        putDirective(kNearSd, sd);
+        putData(static_cast<unsigned char>(sdOffset_));
+      }
+      covered = sd;
+      break;
+    default:
+      putDirective(kWord, word / 2);
+      for (int i = 0; i < word; i += 2) putData(cur[i]);
+      covered = word;
+      break;
+  }
+  srcIndex_ += covered;
+  normalIndex_ = srcIndex_;
+}
+
+// Bytes equal to the one at srcIndex_ from there on, at most kRunProbe. A run is scanned
+// once and remembered, so that steps inside it do not scan it again.
+int qorCompressor_t::runLeng() {
+  const unsigned char* cur = buffer_ + srcIndex_;
+  if (srcIndex_ + 1 >= srcLimit_ || cur[1] != cur[0]) return 1;
+  const int abs = srcBase_ + srcIndex_;
+  if (abs < runFrom_ || abs >= runEnd_) {
+    runFrom_ = abs;
+    runEnd_ = abs + 1;
+    runOpen_ = true;
+  }
+  if (runOpen_ && runEnd_ - abs < kRunProbe) {
+    const int stop = srcLimit_ - srcIndex_ < kRunProbe ? srcLimit_ : srcIndex_ + kRunProbe;
+    int i = runEnd_ - srcBase_;
+    const unsigned char b = cur[0];
+    uint64_t pattern = b * 0x0101010101010101ull;
+    while (i + 8 <= stop) {
+      uint64_t v;
+      std::memcpy(&v, buffer_ + i, sizeof v);
+      if (v != pattern) break;
+      i += 8;
+    }
+    while (i < stop && buffer_[i] == b) ++i;
+    runEnd_ = srcBase_ + i;
+    runOpen_ = i == stop && !(srcRemain_ == 0 && stop == srcLimit_);
+  }
+  return runEnd_ - abs < kRunProbe ? runEnd_ - abs : kRunProbe;
+}
+
+int qorCompressor_t::getZeroLeng() {
+  if (buffer_[srcIndex_] != 0) return 0;
+  const int leng = runLeng();
+  if (leng < 2) return 0;
+  return leng < kMaxRun ? leng : kMaxRun;
+}
+
+int qorCompressor_t::getRleLeng() {
+  if (buffer_[srcIndex_] == 0) return 0;
+  const int leng = runLeng();
+  if (leng < 3) return 0;
+  return leng < kMaxRun ? leng : kMaxRun;
+}
+
+int qorCompressor_t::getSdLeng(int minLeng) {
+  if (minLeng > kMaxMatch) return 0;
+  return finder_->find(srcIndex_, runLeng(), minLeng, sdOffset_);
+}
+
+// The walk over units with a zero high byte: from any unit boundary inside an earlier walk it
+// stops where that walk stopped, so the stop is remembered. A walk cut by the window's end
+// goes on when the window has grown.
+int qorCompressor_t::getWordLeng() {
+  const int cur = srcIndex_;
+  if (buffer_[cur] == 0 || cur + 2 > srcLimit_ || buffer_[cur + 1] != 0) return 0;
+  const int abs = srcBase_ + cur;
+  if (abs < wordFrom_ || abs >= wordEnd_ || ((abs - wordFrom_) & 1) != 0) {
+    wordFrom_ = abs;
+    wordEnd_ = abs;
+    wordLimit_ = 0;  // no window ends at 0: walk
+  }
+  if (wordLimit_ >= 0 && wordLimit_ != srcBase_ + srcLimit_) {
+    int i = wordEnd_ - srcBase_;
+    while (i + 2 <= srcLimit_ && buffer_[i + 1] == 0) {
+      if (buffer_[i] == 0 && buffer_[i - 2] == 0) {
+        i -= 2;
+        break;
+      }
+      i += 2;
+    }
+    wordLimit_ = i + 2 > srcLimit_ ? srcBase_ + srcLimit_ : -1;
+    wordEnd_ = srcBase_ + i;
+  }
+  const int leng = wordEnd_ - abs < kMaxWordBytes ? wordEnd_ - abs : kMaxWordBytes;
+  return leng < 3 ? 0 : leng;
+}
+
+void qorCompressor_t::putData(unsigned char d) {
+  dstBuffer_[dstIndex_++] = d;
+  if (dstIndex_ == kDstSize) flushDstBuff();
+}
+
+void qorCompressor_t::putDirective(unsigned char directive, int leng) {
+  if (leng <= kShortMax) {
+    putData(static_cast<unsigned char>(directive | leng));
+  } else {
+    putData(directive);
+    putData(static_cast<unsigned char>(leng));
+    putData(static_cast<unsigned char>(leng >> 8));
+  }
+}
+
+void qorCompressor_t::putBuff(const void* buff, int leng) {
+  const unsigned char* src = static_cast<const unsigned char*>(buff);
+  while (leng > 0) {
+    const int room = kDstSize - dstIndex_;
+    const int piece = leng < room ? leng : room;
+    std::memcpy(dstBuffer_ + dstIndex_, src, piece);
+    dstIndex_ += piece;
+    src += piece;
+    leng -= piece;
+    if (dstIndex_ == kDstSize) flushDstBuff();
+  }
+}
+
+void qorCompressor_t::flushDstBuff() {
+  if (dstIndex_ > 0) {
+    dstStrm_->WriteBuffer(dstBuffer_, dstIndex_);
+    dstIndex_ = 0;
+  }
+}
+
+void qorCompressor_t::flushNormalData() {
+  const int leng = srcIndex_ - normalIndex_;
+  if (leng > 0) {
+    putDirective(kNormal, leng);
+    putBuff(buffer_ + normalIndex_, leng);
+    normalIndex_ = srcIndex_;
+  }
+}

@@ -1,0 +1,140 @@
+// qorExpander_t: the checked decoder. Payload and output pass through two fixed buffers; each
+// directive is checked once, as a whole, against what is left of the payload, of realSize and
+// of the history, and then copied without further checks.
+#include <cstring>
+
+#include "port/src/error.h"
+#include "qorCompress/src/qorCompress.h"
+
+namespace {
+
+const int kInvalidFormat = 15;
+const int kHistory = 1024;                 // the farthest an sd copy may reach back
+const int kMaxDirective = 3 + 0xFFFF;      // directive byte, long length, 65535 data bytes
+const int kMaxOutput = 2 * 0xFFFF;         // a word directive of 65535 units
+const int kInBlock = 0x40000;
+const int kOutBlock = 0x40000;
+const int kSlack = 16;                     // wide copies may run this far past their end
+
+[[noreturn]] void invalid() { PortErrorThrow(kInvalidFormat); }
+
+inline uint64_t load64(const unsigned char* aPtr) {
+  uint64_t v;
+  std::memcpy(&v, aPtr, sizeof v);
+  return v;
+}
+
+inline void store64(unsigned char* aPtr, uint64_t aValue) { std::memcpy(aPtr, &aValue, sizeof aValue); }
+
+// Copies aLeng bytes from aOffset back; an overlapping copy repeats the last aOffset bytes.
+// May write up to 7 bytes past the end.
+inline void sdCopy(unsigned char* aDst, int aOffset, int aLeng) {
+  const unsigned char* src = aDst - aOffset;
+  if (aOffset >= 8) {
+    for (int k = 0; k < aLeng; k += 8) store64(aDst + k, load64(src + k));
+  } else {
+    for (int k = 0; k < aLeng; ++k) aDst[k] = src[k];
+  }
+}
+
+// Owns the two buffers for one expand() call.
+struct Buffers_t {
+  unsigned char* in = new unsigned char[kInBlock + kMaxDirective + kSlack];
+  unsigned char* out = nullptr;
+  Buffers_t() { out = new unsigned char[kHistory + kOutBlock + kMaxOutput + kSlack]; }
+  ~Buffers_t() {
+    delete[] out;
+    delete[] in;
+  }
+};
+
+}  // namespace
+
+void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int payloadLength,
+                           int realSize) {
+  if (payloadLength < 0 || realSize < 0) invalid();
+  if (payloadLength == 0) {
+    if (realSize != 0) invalid();
+    return;
+  }
+  Buffers_t buf;
+  int in_remain = payloadLength;         // payload bytes not yet read into buf.in
+  const unsigned char* in = buf.in;
+  const unsigned char* in_end = buf.in;
+  unsigned char* const out_start = buf.out + kHistory;
+  unsigned char* out = out_start;
+  unsigned char* out_flushed = out_start;  // bytes before it have gone to dstStrm
+  int64_t out_total = 0;                   // bytes expanded before out_start
+  for (;;) {
+    if (in_end - in < kMaxDirective && in_remain > 0) {
+      const int kept = static_cast<int>(in_end - in);
+      std::memmove(buf.in, in, kept);
+      const int count = kInBlock + kMaxDirective - kept < in_remain ? kInBlock + kMaxDirective - kept
+                                                                    : in_remain;
+      srcStrm.ReadBuffer(buf.in + kept, count);
+      in_remain -= count;
+      in = buf.in;
+      in_end = buf.in + kept + count;
+    }
+    if (out - out_start >= kOutBlock) {
+      dstStrm.WriteBuffer(out_flushed, static_cast<int>(out - out_flushed));
+      std::memmove(buf.out, out - kHistory, kHistory);
+      out_total += out - out_start;
+      out = out_flushed = out_start;
+    }
+
+    if (in == in_end) invalid();
+    const int directive = *in++;
+    if (directive == 0xFF) break;
+    const int code = directive >> 5;
+    int leng = directive & 0x1F;
+    if (leng == 0) {
+      if (in_end - in < 2) invalid();
+      leng = in[0] | in[1] << 8;
+      in += 2;
+      if (leng == 0) invalid();
+    }
+    const int64_t produced = out_total + (out - out_start);
+    const int out_leng = code == 5 ? 2 * leng : leng;
+    if (out_leng > realSize - produced) invalid();
+    const int64_t avail = in_end - in;
+    switch (code) {
+      case 0:
+        if (avail < leng) invalid();
+        std::memcpy(out, in, leng);
+        in += leng;
+        break;
+      case 1:
+        std::memset(out, 0, leng);
+        break;
+      case 2:
+        if (avail < 1) invalid();
+        std::memset(out, *in++, leng);
+        break;
+      case 3:
+      case 4: {
+        if (avail < code - 2) invalid();
+        int offset = in[0];
+        if (code == 4) offset |= in[1] << 8;
+        in += code - 2;
+        if (offset == 0 || offset > kHistory || offset > produced) invalid();
+        sdCopy(out, offset, leng);
+        break;
+      }
+      case 5:
+        if (avail < leng) invalid();
+        for (int k = 0; k < leng; ++k) {
+          out[2 * k] = in[k];
+          out[2 * k + 1] = 0;
+        }
+        in += leng;
+        break;
+      default:
+        invalid();
+    }
+    out += out_leng;
+  }
+  if (in != in_end || in_remain != 0) invalid();
+  if (out_total + (out - out_start) != realSize) invalid();
+  dstStrm.WriteBuffer(out_flushed, static_cast<int>(out - out_flushed));
+}

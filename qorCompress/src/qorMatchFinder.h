@@ -1,0 +1,60 @@
+// qorMatchFinder_t: the compressor's sd search. find() returns exactly what trying every start
+// of the last 1024 bytes would return (the longest match, capped at 2048 bytes and at the
+// window's end, ties to the nearest start), but visits only starts that can share the bytes.
+// Positions in its tables are absolute source offsets, so they survive every window refill.
+#ifndef QOR_MATCHFINDER_H
+#define QOR_MATCHFINDER_H
+
+#include <cstdint>
+
+class qorMatchFinder_t {
+ public:
+  // Allocates the tables (about 100 KB, fewer for short sources); released by the destructor.
+  explicit qorMatchFinder_t(int aLength);
+  ~qorMatchFinder_t();
+  qorMatchFinder_t(const qorMatchFinder_t&) = delete;
+  qorMatchFinder_t& operator=(const qorMatchFinder_t&) = delete;
+
+  // Names the window after every fill: aWindow[i] is the source byte at offset aBase + i, and
+  // aLimit bytes are valid. The window must hold the 1024 + 2048 bytes before every position
+  // searched afterwards (or start at offset 0) and every byte up to the match cap after it.
+  void setWindow(const unsigned char* aWindow, int aBase, int aLimit);
+
+  // Searches at window position aCur for a match of at least aMinLeng (>= 3) bytes. aRunLeng
+  // is the number of bytes equal to the one at aCur from aCur on (capped, at least 1); when it
+  // is 4 or more, aMinLeng must exceed it. Returns the length and sets aOffset, or returns 0
+  // (aOffset unchanged) when the longest match is shorter than aMinLeng.
+  int find(int aCur, int aRunLeng, int aMinLeng, int& aOffset);
+
+ private:
+  struct Run_t {
+    int end;      // absolute offset of the first byte after the run
+    int leng;     // run length, capped at kMaxMatch
+    int key;      // run byte << 8 | byte after the run
+    int prev;     // index of the previous run with the same key hash (absolute count)
+  };
+
+  void insertUpTo(int aAbsCur);
+  void addRun(const unsigned char* aLast, int aAbsEnd);
+  int matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom, int aCap) const;
+  int findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, int& aOffset);
+  int findChain(int aCur, int aMinLeng, int aCap, int& aOffset);
+  int findNear3(int aCur, int& aOffset);
+
+  const unsigned char* window_;
+  int base_;
+  int limit_;
+  int nextInsert_;  // absolute offset of the first position not yet entered
+
+  int hashBits4_;
+  int hashBits3_;
+  int* head4_;  // newest position per hash of 4 bytes not all equal
+  int* prev4_;  // ring of 1024: the previous position with the same hash
+  int* head3_;  // newest position per hash of 3 bytes not all equal
+  int* prev3_;  // ring of 256
+  int* headRun_;  // newest run index per hash of (run byte, byte after the run)
+  Run_t* runs_;   // ring of kRunRing runs of 4 or more equal bytes
+  int runCount_;
+};
+
+#endif
