@@ -1,0 +1,314 @@
+// The built qorUnpack run on archives that the built qorLink makes from real files in a
+// private directory: exact listings, every damage named with its offset, and extraction whose
+// response file relinks the archive byte for byte without writing outside its directory.
+#include <dirent.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "gtest/gtest.h"
+#include "src/qorArchive.h"
+#include "tests/support/linkfixture.h"
+
+namespace {
+
+typedef std::map<std::string, std::string> Files_t;
+
+const char kUsageHead[] = "usage: qorUnpack list ARCHIVE\n";
+
+ToolRun_t Unpack(const LinkTempDir_t& aDir, const std::vector<std::string>& aArgs) {
+  return RunTool(QOR_UNPACK_BIN, aArgs, aDir.Path());
+}
+
+// Links aResp (with aFiles beside it) into aDir/a.LB and returns the archive's bytes.
+std::string LinkArchive(const LinkTempDir_t& aDir, const Files_t& aFiles, const std::string& aResp) {
+  for (const auto& file : aFiles) aDir.Put(file.first, file.second);
+  aDir.Put("a.ls", aResp);
+  ToolRun_t run = RunTool(QOR_LINK_BIN, {"a.ls"}, aDir.Path());
+  EXPECT_EQ(run.status, 0) << run.err;
+  return ReadBytes(aDir / "a.LB");
+}
+
+// Extracts aDir/aArchive into aDir/rt, relinks there and expects the very same bytes back.
+void ExpectRoundTrip(const LinkTempDir_t& aDir, const std::string& aArchive) {
+  ToolRun_t run = Unpack(aDir, {"extract", aArchive, "-C", "rt"});
+  ASSERT_EQ(run.status, 0) << run.err;
+  EXPECT_EQ(run.err, "");
+  const std::string stem = aArchive.substr(0, aArchive.rfind('.'));
+  run = RunTool(QOR_LINK_BIN, {stem + ".ls", "-o", stem + ".LB"}, aDir / "rt");
+  ASSERT_EQ(run.status, 0) << run.err;
+  EXPECT_TRUE(ReadBytes(aDir / aArchive) == ReadBytes(aDir / ("rt/" + stem + ".LB")))
+      << ReadBytes(aDir / ("rt/" + stem + ".ls"));
+}
+
+std::string OwnHeaderFile(uint8_t aType, uint8_t aCompression, const std::string& aBody,
+                          uint32_t aRealSize) {
+  return EntryHeader(aType, aCompression, 9, static_cast<uint32_t>(16 + aBody.size()), "MDL",
+                     aRealSize) + aBody;
+}
+
+TEST(QorUnpackCli, EveryMergeModeRoundTrips) {
+  // An input archive whose entries lie back to back, as the archive merge reads them.
+  const std::string merged = EntryHeader(3, 0, 1, 64, "SUB", 0) + std::string(48, 's') +
+                             EntryHeader(1, 0x10, 0, 64, "DAT", 0) + "m.dat" + Zeros(11) +
+                             std::string(32, 'm') + EndRecord();
+  const Files_t files = {
+      {"a.dat", "hello"},
+      {"big.txt", Pattern(300000, 1)},
+      {"empty.bin", ""},
+      {"noext", Pattern(700, 2)},
+      {"d1/same.dat", "first"},
+      {"d2/same.dat", "second"},
+      {"x.tex2d", std::string(48, 't')},
+      {"m.MB", OwnHeaderFile(1, 0, Pattern(100, 3), 0)},
+      {"c.AB", OwnHeaderFile(7, 1, "\x43\x41\xFF", 3)},
+      {"in.PB", merged},
+      {"raw.TB", EntryHeader(2, 0, 0, 21, "RAW", 0) + "as is" + Zeros(43)},
+  };
+  const struct {
+    const char* what;
+    std::string resp;
+  } cases[] = {
+      {"plain files", "%nocompress\na.dat id=3\nbig.txt comp\nempty.bin\nnoext id=0x10\n"
+                      "%comp\nempty.bin\nx.tex2d id=65535\na.dat setfilename\n"},
+      {"name blocks and duplicates", "%setfilename\nd1/same.dat\nd2/same.dat nocomp\n"
+                                     "a.dat\nd1/same.dat id=2\nnoext\n%nosetfilename\na.dat\n"},
+      {"own headers, archives, raw files", "m.MB\nm.MB nocomp setfilename\nc.AB\nin.PB\nraw.TB\n"},
+      {"without end record", "%noendrecord\na.dat\nbig.txt nocomp\n"},
+      {"empty without end record", "%noendrecord\n"},
+      {"end record alone", "; nothing\n"},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    LinkTempDir_t dir;
+    LinkArchive(dir, files, c.resp);
+    ToolRun_t run = Unpack(dir, {"test", "a.LB"});
+    EXPECT_EQ(run.status, 0) << run.out;
+    EXPECT_EQ(run.out.substr(run.out.size() - 5), ": OK\n") << run.out;
+    ExpectRoundTrip(dir, "a.LB");
+  }
+}
+
+TEST(QorUnpackCli, ExtractWritesFilesByTheirNames) {
+  LinkTempDir_t dir;
+  LinkArchive(dir, {{"d1/same.dat", "first"}, {"d2/same.dat", "second"}, {"a.dat", "hello"},
+                    {"m.MB", OwnHeaderFile(4, 0, "body", 0)}},
+              "%setfilename\nd1/same.dat\nd2/same.dat id=7\n%nosetfilename\na.dat nocomp\nm.MB\n");
+  ASSERT_EQ(Unpack(dir, {"extract", "a.LB", "-C", "x"}).status, 0);
+  EXPECT_EQ(ReadBytes(dir / "x/same.dat"), "first");
+  EXPECT_EQ(ReadBytes(dir / "x/0001/same.dat"), "second");
+  EXPECT_EQ(ReadBytes(dir / "x/0002.dat"), "hello");
+  EXPECT_EQ(ReadBytes(dir / "x/0003.TB").size(), 64u);
+  EXPECT_EQ(ReadBytes(dir / "x/a.ls"),
+            "; extracted by qorUnpack; to rebuild the archive, run in this directory:\n"
+            ";   qorLink a.ls -o a.LB\n"
+            "%setfilename\nsame.dat\n0001/same.dat id=7\n"
+            "%nocompress\n%nosetfilename\n0002.dat\n0003.TB\n");
+}
+
+TEST(QorUnpackCli, ListShowsEveryEntryAndTheTotals) {
+  LinkTempDir_t dir;
+  LinkArchive(dir, {{"a.dat", "hello"}, {"z.bin", Zeros(40)}, {"e", ""}},
+              "%nocompress\na.dat id=3\n%comp\nz.bin setfilename\ne nocomp\n");
+  ToolRun_t run = Unpack(dir, {"list", "a.LB"});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.err, "");
+  EXPECT_EQ(run.out,
+            "    offset type method     userId   fileSize   realSize magic            name\n"
+            "         0   01 stored          3         21          0 DAT              -\n"
+            "        64   01 compressed      0         36         40 BIN              z.bin\n"
+            "       128   01 stored          0         16          0 \\x00             -\n"
+            "3 entries, 9 bytes stored, 45 bytes expanded, end record at offset 192\n");
+}
+
+std::string With(std::string aBytes, size_t aOffset, char aByte) {
+  aBytes[aOffset] = aByte;
+  return aBytes;
+}
+
+TEST(QorUnpackCli, TestNamesEveryDamageWithItsOffset) {
+  LinkTempDir_t base;
+  // Entry 0 at 0: "hello" stored; entry 1 at 64: 40 zero bytes compressed to 20 28 00 FF
+  // (payload at 80..83); entry 2 at 128: 100 bytes stored; the end record at 256.
+  const std::string sound = LinkArchive(
+      base, {{"a.dat", "hello"}, {"z.bin", Zeros(40)}, {"c.dat", std::string(100, 'c')}},
+      "a.dat nocomp\nz.bin\nc.dat nocomp\n");
+  ASSERT_EQ(sound.size(), 320u);
+  ASSERT_EQ(sound.substr(80, 4), std::string("\x20\x28\x00\xFF", 4));
+  const std::string prefix = "a.LB: ";
+  const struct {
+    const char* what;
+    std::string bytes;
+    std::vector<std::string> lines;
+    bool structural;  // extract refuses before writing anything
+  } cases[] = {
+      {"cut in a header", sound.substr(0, 136),
+       {"entry 2, offset 128: the archive ends inside a header (8 of 16 bytes present)"}, true},
+      {"cut in a body", sound.substr(0, 200),
+       {"entry 2, offset 128: fileSize 116 runs past the end of the archive (72 bytes left)"}, true},
+      {"cut in the padding", sound.substr(0, 250),
+       {"entry 2, offset 244: the archive ends inside the padding (6 of 12 bytes present)"}, true},
+      {"huge fileSize", sound.substr(0, 132) + "\xF0\xFF\xFF\xFF" + sound.substr(136),
+       {"entry 2, offset 128: fileSize 4294967280 runs past the end of the archive (192 bytes left)"},
+       true},
+      {"garbage after the end record", sound + "trailing",
+       {"offset 320: 8 bytes follow the end record"}, true},
+      {"lost end mark", With(sound, 83, 0),
+       {"entry 1, offset 80: the compressed body (4 bytes) does not expand to exactly realSize 40 bytes"},
+       false},
+      {"bad directive byte", With(sound, 80, '\xC5'),
+       {"entry 1, offset 80: the compressed body (4 bytes) does not expand to exactly realSize 40 bytes"},
+       false},
+      {"non-zero padding, twice", With(With(sound, 30, 1), 250, 'p'),
+       {"entry 0, offset 30: non-zero byte in the padding",
+        "entry 2, offset 250: non-zero byte in the padding"},
+       false},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    LinkTempDir_t dir;
+    dir.Put("a.LB", c.bytes);
+    std::string want;
+    for (const std::string& line : c.lines) want += prefix + line + "\n";
+    want += prefix + std::to_string(c.lines.size()) + (c.lines.size() == 1 ? " problem" : " problems") +
+            " found\n";
+    ToolRun_t run = Unpack(dir, {"test", "a.LB"});
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.out, want);
+
+    run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
+    if (c.structural) {
+      EXPECT_EQ(run.status, 1);
+      EXPECT_EQ(run.err, "qorUnpack: " + prefix + c.lines[0] + "\n");
+      EXPECT_FALSE(FileExists(dir / "x"));
+      run = Unpack(dir, {"list", "a.LB"});
+      EXPECT_EQ(run.status, 1);
+      EXPECT_EQ(run.err, "qorUnpack: " + prefix + c.lines[0] + "\n");
+    } else if (c.lines[0].find("compressed") != std::string::npos) {
+      EXPECT_EQ(run.status, 1);
+      EXPECT_EQ(run.err, "qorUnpack: " + prefix + c.lines[0] + "\n");
+      EXPECT_FALSE(FileExists(dir / "x/a.ls"));
+    } else {
+      EXPECT_EQ(run.status, 0) << run.err;  // padding is kept as it is, in raw files
+      ExpectRoundTrip(dir, "a.LB");
+    }
+  }
+}
+
+std::string NamedEntry(const std::string& aName, const std::string& aBody) {
+  const std::string block = aName + Zeros(16 - aName.size() % 16);
+  const uint32_t file_size = static_cast<uint32_t>(16 + block.size() + aBody.size());
+  const uint8_t compression = static_cast<uint8_t>(block.size());
+  return EntryHeader(1, compression, 0, file_size, "DAT", 0) + block + aBody +
+         Zeros(QorPadLength(file_size));
+}
+
+// Every path below the temporary directory, relative to it.
+void ListTree(const std::string& aRoot, const std::string& aRel, std::vector<std::string>& aOut) {
+  DIR* d = opendir((aRoot + "/" + aRel).c_str());
+  ASSERT_NE(d, nullptr);
+  while (struct dirent* ent = readdir(d)) {
+    const std::string name = ent->d_name;
+    if (name == "." || name == "..") continue;
+    const std::string rel = aRel.empty() ? name : aRel + "/" + name;
+    aOut.push_back(rel);
+    if (ent->d_type == DT_DIR) ListTree(aRoot, rel, aOut);
+  }
+  closedir(d);
+}
+
+TEST(QorUnpackCli, HostileNamesStayInsideTheDirectory) {
+  LinkTempDir_t dir;
+  const char* names[] = {"../up.dat", "/tmp/abs.dat", "a/b.dat", "", "a\x01.dat",
+                         "..",        "a\\b.dat",     "%p.dat",  "ok.dat", "ok.dat"};
+  std::string archive;
+  for (const char* name : names) archive += NamedEntry(name, "data");
+  dir.Put("a.LB", archive + EndRecord());
+  dir.Put("x/keep", "");
+  ToolRun_t run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
+  ASSERT_EQ(run.status, 0) << run.err;
+  std::vector<std::string> tree;
+  ListTree(dir.Path(), "", tree);
+  std::sort(tree.begin(), tree.end());
+  const std::vector<std::string> want = {
+      "a.LB",       "x",          "x/0000.TB", "x/0001.TB", "x/0002.TB", "x/0003.TB", "x/0004.TB",
+      "x/0005.TB",  "x/0006.TB",  "x/0007.TB", "x/0009",    "x/0009/ok.dat", "x/a.ls", "x/keep",
+      "x/ok.dat"};
+  EXPECT_EQ(tree, want);
+  ExpectRoundTrip(dir, "a.LB");
+}
+
+TEST(QorUnpackCli, PayloadsFromAnotherEncoderAreKeptRaw) {
+  LinkTempDir_t dir;
+  // "AAA" as a normal run: valid, but qorLink's compressor writes 43 41 FF for it.
+  const std::string payload("\x03" "AAA" "\xFF", 5);
+  dir.Put("a.LB", EntryHeader(1, 1, 0, 21, "DAT", 3) + payload + Zeros(43) + EndRecord());
+  EXPECT_EQ(Unpack(dir, {"test", "a.LB"}).status, 0);
+  ExpectRoundTrip(dir, "a.LB");
+  EXPECT_EQ(ReadBytes(dir / "rt/0000.TB").size(), 64u);
+}
+
+TEST(QorUnpackCli, ExistingFilesAreReplacedOnlyWithForce) {
+  LinkTempDir_t dir;
+  LinkArchive(dir, {{"a.dat", "hello"}}, "a.dat setfilename\n");
+  ASSERT_EQ(Unpack(dir, {"extract", "a.LB", "-C", "x"}).status, 0);
+  dir.Put("x/a.dat", "changed");
+  ToolRun_t run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "qorUnpack: x/a.dat: already exists (-f overwrites)\n");
+  EXPECT_EQ(ReadBytes(dir / "x/a.dat"), "changed");
+  run = Unpack(dir, {"extract", "-f", "a.LB", "-C", "x"});
+  EXPECT_EQ(run.status, 0) << run.err;
+  EXPECT_EQ(ReadBytes(dir / "x/a.dat"), "hello");
+}
+
+TEST(QorUnpackCli, UsageErrorsExitWithTwo) {
+  const struct {
+    std::vector<std::string> args;
+    std::string first_line;
+  } cases[] = {
+      {{}, "qorUnpack: no command given"},
+      {{"unpack", "a.LB"}, "qorUnpack: unknown command 'unpack'"},
+      {{"list"}, "qorUnpack: no archive given"},
+      {{"test", "a.LB", "b.LB"}, "qorUnpack: more than one archive given ('b.LB')"},
+      {{"extract", "a.LB", "-C"}, "qorUnpack: -C needs a directory"},
+      {{"extract", "a.LB", "-x"}, "qorUnpack: unknown option '-x'"},
+      {{"list", "a.LB", "-f"}, "qorUnpack: unknown option '-f'"},
+  };
+  LinkTempDir_t dir;
+  for (const auto& c : cases) {
+    ToolRun_t run = Unpack(dir, c.args);
+    EXPECT_EQ(run.status, 2);
+    EXPECT_EQ(run.out, "");
+    EXPECT_EQ(run.err, c.first_line + "\n" + kUsageHead +
+                           "       qorUnpack test ARCHIVE\n"
+                           "       qorUnpack extract ARCHIVE [-C DIR] [-f]\n"
+                           "       qorUnpack --version\n");
+  }
+  ToolRun_t run = Unpack(dir, {"--version"});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.out, "qorUnpack version 0.01\n");
+  run = Unpack(dir, {"test", "missing.LB"});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "qorUnpack: missing.LB could't open.\n");
+}
+
+// The real-data case: set QOR_CORPUS_DIR to a directory made by bench/make-corpus.sh.
+TEST(QorUnpackCli, CorpusArchiveRoundTrips) {
+  const char* corpus = getenv("QOR_CORPUS_DIR");
+  if (corpus == nullptr || !FileExists(std::string(corpus) + "/freedoom.ls")) {
+    GTEST_SKIP() << "QOR_CORPUS_DIR is not set to a corpus directory";
+  }
+  LinkTempDir_t dir;
+  ToolRun_t run = RunTool(QOR_LINK_BIN, {"freedoom.ls", "-o", dir / "freedoom.LB"}, corpus);
+  ASSERT_EQ(run.status, 0) << run.err;
+  run = Unpack(dir, {"test", "freedoom.LB"});
+  EXPECT_EQ(run.status, 0) << run.out;
+  ExpectRoundTrip(dir, "freedoom.LB");
+}
+
+}  // namespace
