@@ -32,7 +32,7 @@ struct PortSerializeRegPack_t {
 // owned), a version number kept for the caller and a flag word whose bit 0 is the verbose bit.
 class PortSerialize_t {
  public:
-  static const int kVerbose = 1;
+  static constexpr int kVerbose = 1;
 
   PortSerialize_t();
   virtual ~PortSerialize_t() {}
