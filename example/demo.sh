@@ -19,7 +19,8 @@ bytes() { tail -c +$(($1 + 1)) "$archive" | head -c "$2"; }
 size=$(wc -c < "$archive")
 echo "linked example/stage1.ls -> ${archive#"$PWD"/} ($size bytes)"
 echo
-printf '%-8s %-47s  %s\n' offset "header bytes" "fileType compression userId fileSize magic realSize [name]"
+printf '%-8s %-47s  %-4s %-4s %6s %8s %-5s %8s %s\n' offset "header bytes" type comp userId \
+  fileSize magic realSize name
 offset=0
 while [ "$offset" -lt "$size" ]; do
   # shellcheck disable=SC2046
@@ -31,7 +32,7 @@ while [ "$offset" -lt "$size" ]; do
   name_block=$(($2 & 0xF0))
   name=""
   [ "$name_block" -gt 0 ] && name=$(bytes $((offset + 16)) "$name_block" | tr -d '\0')
-  printf '0x%06X %-47s  0x%02X 0x%02X %5d %7d %-4s %7d %s\n' "$offset" "${hex# }" "$1" "$2" \
+  printf '0x%06X %-47s  0x%02X 0x%02X %6d %8d %-5s %8d %s\n' "$offset" "${hex# }" "$1" "$2" \
     $(($3 + 256 * $4)) "$file_size" "$magic" "$real_size" "$name"
   [ "$1" -eq 255 ] && break
   if [ "$file_size" -lt 16 ]; then echo "(no entry header here: stopping)"; break; fi
