@@ -94,18 +94,20 @@ TEST(EntryWriter, UserIdIsLow16BitsOfTheIdOption) {
 TEST(EntryWriter, NameBlockHoldsBaseNameRoundedToSixteen) {
   struct Case {
     std::string name;
+    const char magic[4];
     size_t block;
-  } cases[] = {{"data/img/a.dat", 16}, {std::string(11, 'f') + ".bin", 16},
-               {std::string(12, 'g') + ".bin", 32}, {std::string(43, 'h') + ".bin", 48}};
+  } cases[] = {{"data/img/a.dat", {'D', 'A', 'T', 0}, 16},
+               {std::string(11, 'f') + ".bin", {'B', 'I', 'N', 0}, 16},
+               {std::string(12, 'g') + ".bin", {'B', 'I', 'N', 0}, 32},
+               {std::string(43, 'h') + ".bin", {'B', 'I', 'N', 0}, 48}};
   for (const Case& c : cases) {
     LinkTempDir_t dir;
     dir.Put(c.name, "hello");
     std::string base = c.name.substr(c.name.rfind('/') + 1);
-    std::string expected =
-        EntryHeader(1, static_cast<uint8_t>(c.block), 0, static_cast<uint32_t>(21 + c.block), "BIN\0", 0);
-    if (c.name == "data/img/a.dat") expected = EntryHeader(1, 0x10, 0, 37, "DAT\0", 0);
-    expected += base + Zeros(c.block - base.size()) + "hello";
-    expected += Zeros(63 - (20 + c.block) % 64) + EndRecord();
+    uint32_t file_size = static_cast<uint32_t>(16 + c.block + 5);
+    std::string expected = EntryHeader(1, static_cast<uint8_t>(c.block), 0, file_size, c.magic, 0) +
+                           base + Zeros(c.block - base.size()) + "hello" +
+                           Zeros((64 - file_size % 64) % 64) + EndRecord();
     EXPECT_EQ(LinkLines(dir, "%setfilename\n%nocomp\n@/" + c.name + "\n"), expected) << c.name;
   }
 }
