@@ -49,7 +49,8 @@ limit_kb=$(( (largest + 16 * 1024 * 1024) / 1024 ))
 
 verdict() { if [ "$(calc "$1")" = 1 ]; then echo met; else echo MISSED; fi; }
 echo "corpus: $(grep -c . "$work/files") files; compressor: $summary"
-echo "archives: stored $(wc -c < "$work/stored.LB") bytes, compressed $(wc -c < "$work/compressed.LB") bytes"
+echo "archives: stored $(wc -c < "$work/stored.LB") bytes," \
+  "compressed $(wc -c < "$work/compressed.LB") bytes"
 printf 'stored link      %6ss   tar -cf     %6ss   ratio %.2f (target <= 2.0: %s)\n' \
   "$stored_s" "$tar_s" "$(calc "$stored_s / $tar_s")" "$(verdict "$stored_s <= 2 * $tar_s")"
 printf 'compressed link  %6ss   compressor  %6ss   ratio %.2f (target <= 1.2: %s)\n' \

@@ -159,7 +159,8 @@ void NormalWrite(PortStream_t& dst_strm, PortStream_t& src_strm, PortFilename_t&
     PortMemoryStream_t mem_strm;
     qorCompressor_t compressor;
     compressor.compress(mem_strm, src_strm, org_body_size);
-    header.fileSize = header_add_size + static_cast<uint32_t>(mem_strm.GetLength()) + kQorHeaderSize;
+    header.fileSize =
+        header_add_size + static_cast<uint32_t>(mem_strm.GetLength()) + kQorHeaderSize;
     mem_strm.Seek(0, 0);
     WriteHeader(dst_strm, header);
     dst_strm.WriteBuffer(header_add_buff, header_add_size);

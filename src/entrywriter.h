@@ -12,7 +12,7 @@
 
 // How a listed file goes into the archive, chosen by the response-file loop from its extension.
 enum qorMergeMode_t {
-  kQorMergeOwnHeader = 0,  // begins with its own 16-byte header: header kept, body stored or compressed
+  kQorMergeOwnHeader = 0,  // starts with its own 16-byte header: kept, body stored or compressed
   kQorMergeArchive = 1,    // an archive: its entries copied unchanged up to its end record
   kQorMergeRaw = 2,        // copied byte for byte, no header
   kQorMergePlain = 3,      // plain data: a new header, body stored or compressed

@@ -85,7 +85,8 @@ TEST(EntryWriter, UserIdIsLow16BitsOfTheIdOption) {
   for (const Case& c : cases) {
     LinkTempDir_t dir;
     dir.Put("a.dat", "hello");
-    std::string expected = EntryHeader(1, 0, c.id, 21, "DAT\0", 0) + "hello" + Zeros(43) + EndRecord();
+    std::string expected =
+        EntryHeader(1, 0, c.id, 21, "DAT\0", 0) + "hello" + Zeros(43) + EndRecord();
     EXPECT_EQ(LinkLines(dir, std::string("@/a.dat nocomp ") + c.options + "\n"), expected)
         << c.options;
   }
@@ -163,7 +164,8 @@ TEST(EntryWriter, ArchiveEntriesAreCopiedUpToTheEndRecord) {
   dir.Put("m.PB", first + second + third + EndRecord() + "ignored");
   dir.Put("e.pb", EndRecord() + first);
   dir.Put("r.TB", "raw bytes");
-  std::string archive = LinkLines(dir, "@/m.PB id=zz comp comp\n@/e.pb\n@/r.TB setfilename nocomp nocomp\n");
+  std::string archive =
+      LinkLines(dir, "@/m.PB id=zz comp comp\n@/e.pb\n@/r.TB setfilename nocomp nocomp\n");
   EXPECT_EQ(archive, first + Zeros(43) + second + third + Zeros(14) + "raw bytes" + Zeros(55) +
                          EndRecord());
 }

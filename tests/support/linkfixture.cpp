@@ -120,7 +120,9 @@ std::string EndRecord() {
 
 uint32_t Le32At(const std::string& aBytes, size_t aOffset) {
   uint32_t value = 0;
-  for (int i = 3; i >= 0; --i) value = (value << 8) | static_cast<unsigned char>(aBytes.at(aOffset + i));
+  for (int i = 3; i >= 0; --i) {
+    value = (value << 8) | static_cast<unsigned char>(aBytes.at(aOffset + i));
+  }
   return value;
 }
 
