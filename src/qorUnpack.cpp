@@ -64,9 +64,9 @@ int ParseArgs(int argc, char** argv, qorUnpackArgs_t& aArgs) {
 
 int Run(const qorUnpackArgs_t& aArgs) {
   if (strcmp(aArgs.command, "list") == 0) {
-    UnpackList(aArgs.archive);
+    UnpackList(aArgs.archive, stdout);
   } else if (strcmp(aArgs.command, "test") == 0) {
-    if (UnpackTest(aArgs.archive) > 0) return kExitFailure;
+    if (UnpackTest(aArgs.archive, stdout) > 0) return kExitFailure;
   } else {
     UnpackExtract(aArgs.archive, aArgs.dir, aArgs.force);
   }

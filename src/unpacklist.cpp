@@ -52,16 +52,16 @@ PortString_t EscapedText(const unsigned char* aBytes, int aLength) {
   return text;
 }
 
-void UnpackList(const PortString_t& aArchive) {
+void UnpackList(const PortString_t& aArchive, FILE* aOut) {
   qorArchiveReader_t reader(aArchive);
-  printf("%10s %4s %-10s %6s %10s %10s %-16s %s\n", "offset", "type", "method", "userId",
+  fprintf(aOut, "%10s %4s %-10s %6s %10s %10s %-16s %s\n", "offset", "type", "method", "userId",
          "fileSize", "realSize", "magic", "name");
   uint64_t stored = 0;
   uint64_t expanded = 0;
   while (reader.Next()) {
     const qorArchiveEntry_t& e = reader.Entry();
     const qorStdFileHeader_t& h = e.header;
-    printf("%10d %4.2X %-10s %6u %10u %10u %-16s %s\n", e.offset, h.fileType,
+    fprintf(aOut, "%10d %4.2X %-10s %6u %10u %10u %-16s %s\n", e.offset, h.fileType,
            MethodName(e.Method()), h.userId, h.fileSize, h.realSize, MagicText(h.magicCode).c_str(),
            NameColumn(e).c_str());
     stored += static_cast<uint64_t>(e.BodySize());
@@ -71,6 +71,6 @@ void UnpackList(const PortString_t& aArchive) {
   PortString_t end = reader.EndRecordOffset() >= 0
                          ? PortString_t::Format("end record at offset %d", reader.EndRecordOffset())
                          : PortString_t("no end record");
-  printf("%d entries, %" PRIu64 " bytes stored, %" PRIu64 " bytes expanded, %s\n",
+  fprintf(aOut, "%d entries, %" PRIu64 " bytes stored, %" PRIu64 " bytes expanded, %s\n",
          reader.EntryCount(), stored, expanded, end.c_str());
 }

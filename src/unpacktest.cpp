@@ -35,19 +35,19 @@ void CheckEntry(qorArchiveReader_t& aReader, uint64_t& aExpanded) {
 
 }  // namespace
 
-int UnpackTest(const PortString_t& aArchive) {
+int UnpackTest(const PortString_t& aArchive, FILE* aOut) {
   qorArchiveReader_t reader(aArchive);
   uint64_t expanded = 0;
   while (reader.Next()) CheckEntry(reader, expanded);
   const int problem_count = static_cast<int>(reader.Problems().size());
   for (const qorArchiveProblem_t& problem : reader.Problems()) {
-    printf("%s\n", reader.Describe(problem).c_str());
+    fprintf(aOut, "%s\n", reader.Describe(problem).c_str());
   }
   if (problem_count > 0) {
-    printf("%s: %d problem%s found\n", aArchive.c_str(), problem_count,
+    fprintf(aOut, "%s: %d problem%s found\n", aArchive.c_str(), problem_count,
            problem_count == 1 ? "" : "s");
   } else {
-    printf("%s: %d entries, %" PRIu64 " bytes expanded, %s: OK\n", aArchive.c_str(),
+    fprintf(aOut, "%s: %d entries, %" PRIu64 " bytes expanded, %s: OK\n", aArchive.c_str(),
            reader.EntryCount(), expanded,
            reader.State() == kQorWalkEndRecord ? "end record present" : "no end record");
   }
