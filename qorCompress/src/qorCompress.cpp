@@ -90,7 +90,20 @@ void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int
     }
     // Steps until the next refill point cannot change the window.
     const int stop = srcRemain_ > 0 ? srcLimit_ - kRefillAt : srcLimit_;
-    do step(); while (srcIndex_ < stop);
+    while (srcIndex_ < stop) {
+      const unsigned char* at = buffer_ + srcIndex_;
+      // The skipper's own first test, here to save a call where it fails.
+      if (srcLimit_ - srcIndex_ > 3 && at[1] != at[0] && (at[1] != 0 || at[3] != 0)) {
+        const int normal_stop = normalIndex_ + kMaxNormal;
+        const int next = finder.skipLiterals(srcIndex_, stop < normal_stop ? stop : normal_stop);
+        if (next != srcIndex_) {
+          srcIndex_ = next;
+          if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
+          continue;
+        }
+      }
+      step();
+    }
   }
   flushNormalData();
   putData(kEndMark);
@@ -114,12 +127,13 @@ void qorCompressor_t::refill(PortStream_t& srcStrm) {
 void qorCompressor_t::step() {
   int best = 0;
   Kind_t kind = kNone;
-  const int zero = getZeroLeng();
+  const int run = runLeng();
+  const int zero = getZeroLeng(run);
   if (zero > 0) {
     best = zeroScore(zero);
     kind = kKindZero;
   }
-  const int rle = getRleLeng();
+  const int rle = getRleLeng(run);
   if (rle > 0 && rleScore(rle) > best) {
     best = rleScore(rle);
     kind = kKindRle;
@@ -128,7 +142,7 @@ void qorCompressor_t::step() {
   // loses to it, so the search need not look for one.
   const int word = getWordLeng();
   const int word_score = word > 0 ? wordScore(word / 2) : 0;
-  const int sd = getSdLeng(minSdLeng(best, word_score));
+  const int sd = getSdLeng(run, minSdLeng(best, word_score));
   if (sd > 0) {
     int score = sdScore(sd);
     if (sdOffset_ > kNearMax) --score;
@@ -178,11 +192,16 @@ void qorCompressor_t::step() {
   normalIndex_ = srcIndex_;
 }
 
-// Bytes equal to the one at srcIndex_ from there on, at most kRunProbe. A run is scanned
-// once and remembered, so that steps inside it do not scan it again.
-int qorCompressor_t::runLeng() {
+// Bytes equal to the one at srcIndex_ from there on, at most kRunProbe.
+inline int qorCompressor_t::runLeng() {
   const unsigned char* cur = buffer_ + srcIndex_;
   if (srcIndex_ + 1 >= srcLimit_ || cur[1] != cur[0]) return 1;
+  return longRunLeng();
+}
+
+// A run is scanned once and remembered, so that steps inside it do not scan it again.
+int qorCompressor_t::longRunLeng() {
+  const unsigned char* cur = buffer_ + srcIndex_;
   const int abs = srcBase_ + srcIndex_;
   if (abs < runFrom_ || abs >= runEnd_) {
     runFrom_ = abs;
@@ -207,32 +226,32 @@ int qorCompressor_t::runLeng() {
   return runEnd_ - abs < kRunProbe ? runEnd_ - abs : kRunProbe;
 }
 
-int qorCompressor_t::getZeroLeng() {
-  if (buffer_[srcIndex_] != 0) return 0;
-  const int leng = runLeng();
-  if (leng < 2) return 0;
-  return leng < kMaxRun ? leng : kMaxRun;
+inline int qorCompressor_t::getZeroLeng(int run) {
+  if (buffer_[srcIndex_] != 0 || run < 2) return 0;
+  return run < kMaxRun ? run : kMaxRun;
 }
 
-int qorCompressor_t::getRleLeng() {
-  if (buffer_[srcIndex_] == 0) return 0;
-  const int leng = runLeng();
-  if (leng < 3) return 0;
-  return leng < kMaxRun ? leng : kMaxRun;
+inline int qorCompressor_t::getRleLeng(int run) {
+  if (buffer_[srcIndex_] == 0 || run < 3) return 0;
+  return run < kMaxRun ? run : kMaxRun;
 }
 
-int qorCompressor_t::getSdLeng(int minLeng) {
+inline int qorCompressor_t::getSdLeng(int run, int minLeng) {
   if (minLeng > kMaxMatch) return 0;
-  return finder_->find(srcIndex_, runLeng(), minLeng, sdOffset_);
+  return finder_->find(srcIndex_, run, minLeng, sdOffset_);
+}
+
+inline int qorCompressor_t::getWordLeng() {
+  const int cur = srcIndex_;
+  if (buffer_[cur] == 0 || cur + 2 > srcLimit_ || buffer_[cur + 1] != 0) return 0;
+  return wordWalk();
 }
 
 // The walk over units with a zero high byte: from any unit boundary inside an earlier walk it
 // stops where that walk stopped, so the stop is remembered. A walk cut by the window's end
 // goes on when the window has grown.
-int qorCompressor_t::getWordLeng() {
-  const int cur = srcIndex_;
-  if (buffer_[cur] == 0 || cur + 2 > srcLimit_ || buffer_[cur + 1] != 0) return 0;
-  const int abs = srcBase_ + cur;
+int qorCompressor_t::wordWalk() {
+  const int abs = srcBase_ + srcIndex_;
   if (abs < wordFrom_ || abs >= wordEnd_ || ((abs - wordFrom_) & 1) != 0) {
     wordFrom_ = abs;
     wordEnd_ = abs;
@@ -254,12 +273,12 @@ int qorCompressor_t::getWordLeng() {
   return leng < 3 ? 0 : leng;
 }
 
-void qorCompressor_t::putData(unsigned char d) {
+inline void qorCompressor_t::putData(unsigned char d) {
   dstBuffer_[dstIndex_++] = d;
   if (dstIndex_ == kDstSize) flushDstBuff();
 }
 
-void qorCompressor_t::putDirective(unsigned char directive, int leng) {
+inline void qorCompressor_t::putDirective(unsigned char directive, int leng) {
   if (leng <= kShortMax) {
     putData(static_cast<unsigned char>(directive | leng));
   } else {

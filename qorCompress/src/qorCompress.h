@@ -26,11 +26,13 @@ class qorCompressor_t {
 
   void refill(PortStream_t& srcStrm);
   void step();
-  int runLeng();
-  int getZeroLeng();
-  int getRleLeng();
-  int getSdLeng(int minLeng);  // only matches of at least minLeng bytes count
+  int runLeng();      // bytes equal to the current one, from it on; the measures share it
+  int longRunLeng();
+  int getZeroLeng(int run);
+  int getRleLeng(int run);
+  int getSdLeng(int run, int minLeng);  // only matches of at least minLeng bytes count
   int getWordLeng();
+  int wordWalk();
   void putData(unsigned char d);
   void putDirective(unsigned char directive, int leng);
   void putBuff(const void* buff, int leng);

@@ -9,10 +9,15 @@ const int kMaxMatch = 2048;
 const int kNearMax = 255;
 const int kRunRing = 512;  // runs of 4+ bytes ending in the last 1024 bytes number at most 206
 
+// Little-endian by construction; compilers make one load of it.
 inline uint32_t load32(const unsigned char* aPtr) {
-  uint32_t v;
-  std::memcpy(&v, aPtr, sizeof v);
-  return v;
+  return static_cast<uint32_t>(aPtr[0]) | static_cast<uint32_t>(aPtr[1]) << 8 |
+         static_cast<uint32_t>(aPtr[2]) << 16 | static_cast<uint32_t>(aPtr[3]) << 24;
+}
+
+inline uint32_t load24(const unsigned char* aPtr) {
+  return static_cast<uint32_t>(aPtr[0]) | static_cast<uint32_t>(aPtr[1]) << 8 |
+         static_cast<uint32_t>(aPtr[2]) << 16;
 }
 
 inline uint64_t load64(const unsigned char* aPtr) {
@@ -32,17 +37,20 @@ qorMatchFinder_t::qorMatchFinder_t(int aLength)
   // Only the last 1024 positions are ever live, so small tables suffice; short sources get
   // smaller ones still, since they are cleared on every call.
   const bool small = aLength <= 8192;
-  hashBits4_ = small ? 11 : 14;
-  hashBits3_ = small ? 9 : 12;
+  hashBits4_ = small ? 10 : 12;
+  hashBits3_ = small ? 8 : 10;
   const int run_heads = 1 << hashBits3_;
-  head4_ = new int[(1 << hashBits4_) + kMaxOffset + (1 << hashBits3_) + (kNearMax + 1) + run_heads];
-  prev4_ = head4_ + (1 << hashBits4_);
+  // Each head table has one slot more: the chain of run positions, which no search walks.
+  const int heads4 = (1 << hashBits4_) + 1;
+  const int heads3 = (1 << hashBits3_) + 1;
+  head4_ = new int[heads4 + kMaxOffset + heads3 + (kNearMax + 1) + run_heads];
+  prev4_ = head4_ + heads4;
   head3_ = prev4_ + kMaxOffset;
-  prev3_ = head3_ + (1 << hashBits3_);
+  prev3_ = head3_ + heads3;
   headRun_ = prev3_ + (kNearMax + 1);
   // 0x80 bytes make every head a large negative offset: older than any position searched.
-  std::memset(head4_, 0x80, sizeof(int) << hashBits4_);
-  std::memset(head3_, 0x80, sizeof(int) << hashBits3_);
+  std::memset(head4_, 0x80, sizeof(int) * heads4);
+  std::memset(head3_, 0x80, sizeof(int) * heads3);
   std::memset(headRun_, 0xFF, sizeof(int) * run_heads);
   runs_ = new Run_t[kRunRing];
 }
@@ -58,33 +66,77 @@ void qorMatchFinder_t::setWindow(const unsigned char* aWindow, int aBase, int aL
   limit_ = aLimit;
 }
 
-void qorMatchFinder_t::insertUpTo(int aAbsCur) {
+// A position whose first 4 (or 3) bytes are all equal lies in a run. Runs are listed once
+// instead (addRun), so such positions go to the spare slot: long runs make no long chains.
+inline void qorMatchFinder_t::insert4(const unsigned char* aAt, int aAbs, uint32_t aFirst4) {
+  const bool in_run = aFirst4 == (aFirst4 & 0xFF) * 0x01010101u;
+  const int h = in_run ? 1 << hashBits4_ : hashOf(aFirst4, hashBits4_);
+  prev4_[aAbs & (kMaxOffset - 1)] = head4_[h];
+  head4_[h] = aAbs;
+  if (in_run && aAbs + 4 < base_ + limit_ && aAt[4] != aAt[0]) addRun(aAt + 3, aAbs + 4);
+}
+
+inline void qorMatchFinder_t::insert3(int aAbs, uint32_t aFirst3) {
+  const bool in_run = aFirst3 == (aFirst3 & 0xFF) * 0x010101u;
+  const int h = in_run ? 1 << hashBits3_ : hashOf(aFirst3, hashBits3_);
+  prev3_[aAbs & kNearMax] = head3_[h];
+  head3_[h] = aAbs;
+}
+
+void qorMatchFinder_t::insertRange(int aAbsCur) {
   int p = nextInsert_ > aAbsCur - kMaxOffset ? nextInsert_ : aAbsCur - kMaxOffset;
-  const int abs_limit = base_ + limit_;
-  for (; p < aAbsCur; ++p) {
-    const unsigned char* s = window_ + (p - base_);
-    const int avail = abs_limit - p;
-    // A position whose first bytes are all equal lies in a run; runs are listed once
-    // instead, so that long runs do not make long chains.
-    if (avail >= 4) {
-      const uint32_t v = load32(s);
-      if (v != s[0] * 0x01010101u) {
-        const int h = hashOf(v, hashBits4_);
-        prev4_[p & (kMaxOffset - 1)] = head4_[h];
-        head4_[h] = p;
-      }
-    }
-    if (avail >= 3 && (s[0] != s[1] || s[1] != s[2])) {
-      const int h = hashOf(s[0] | s[1] << 8 | s[2] << 16, hashBits3_);
-      prev3_[p & kNearMax] = head3_[h];
-      head3_[h] = p;
-    }
-    if (avail >= 2 && s[1] != s[0] && p - base_ >= 3 && s[-1] == s[0] && s[-2] == s[0] &&
-        s[-3] == s[0]) {
-      addRun(s, p + 1);
-    }
-  }
   nextInsert_ = aAbsCur;
+  const unsigned char* const window = window_ - base_;  // indexed by absolute offsets
+  const int abs_limit = base_ + limit_;
+  // The 4-byte chains need every position of the last 1024 that has 4 bytes, the 3-byte
+  // table those of the last 255 that have 3.
+  const int stop4 = abs_limit - 3 < aAbsCur ? abs_limit - 3 : aAbsCur;
+  const int near_from = aAbsCur - kNearMax;
+  for (; p < stop4 && p < near_from; ++p) insert4(window + p, p, load32(window + p));
+  for (; p < stop4; ++p) {
+    const uint32_t v = load32(window + p);
+    insert4(window + p, p, v);
+    insert3(p, v & 0xFFFFFF);
+  }
+  for (; p < aAbsCur; ++p) {
+    if (p >= near_from && p + 2 < abs_limit) insert3(p, load24(window + p));
+  }
+}
+
+int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
+  insertUpTo(base_ + aCur);
+  const unsigned char* const window = window_ - base_;
+  int* const head4 = head4_;
+  int* const prev4 = prev4_;
+  int* const head3 = head3_;
+  int* const prev3 = prev3_;
+  const int bits4 = hashBits4_;
+  const int bits3 = hashBits3_;
+  // Four bytes are read from each position.
+  const int stop = base_ + (aStop < limit_ - 3 ? aStop : limit_ - 3);
+  int abs = base_ + aCur;
+  for (; abs < stop; ++abs) {
+    const unsigned char* s = window + abs;
+    // A zero or rle run needs the next byte equal, a word run of 2 units the high bytes 0.
+    if (s[1] == s[0] || (s[1] == 0 && s[3] == 0)) break;
+    const uint32_t v = load32(s);
+    const int h4 = hashOf(v, bits4);
+    const int h3 = hashOf(v & 0xFFFFFF, bits3);
+    int j = head4[h4];
+    while (j >= abs - kMaxOffset && load32(window + j) != v) j = prev4[j & (kMaxOffset - 1)];
+    if (j >= abs - kMaxOffset) break;
+    int k = head3[h3];
+    while (k >= abs - kNearMax && (load32(window + k) & 0xFFFFFF) != (v & 0xFFFFFF)) {
+      k = prev3[k & kNearMax];
+    }
+    if (k >= abs - kNearMax) break;
+    prev4[abs & (kMaxOffset - 1)] = head4[h4];
+    head4[h4] = abs;
+    prev3[abs & kNearMax] = head3[h3];
+    head3[h3] = abs;
+  }
+  nextInsert_ = abs;
+  return abs - base_;
 }
 
 void qorMatchFinder_t::addRun(const unsigned char* aLast, int aAbsEnd) {
@@ -143,7 +195,8 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
     const int j = run.end - aRunLeng;
     if (j < lowest) break;
     i = run.prev;
-    if (run.key != key || run.leng < aRunLeng) continue;
+    // A run is listed as soon as its end is in the window: the one at aCur itself may be.
+    if (run.key != key || run.leng < aRunLeng || j >= abs_cur) continue;
     const unsigned char* cand = window_ + (j - base_);
     if (cand[best] != cur[best]) continue;
     const int leng = matchLeng(cand, cur, aRunLeng + 1, aCap);
@@ -185,7 +238,7 @@ int qorMatchFinder_t::findNear3(int aCur, int& aOffset) {
   const unsigned char* cur = window_ + aCur;
   const int abs_cur = base_ + aCur;
   const int lowest = abs_cur - kNearMax;
-  for (int j = head3_[hashOf(cur[0] | cur[1] << 8 | cur[2] << 16, hashBits3_)]; j >= lowest;
+  for (int j = head3_[hashOf(load24(cur), hashBits3_)]; j >= lowest;
        j = prev3_[j & kNearMax]) {
     const unsigned char* cand = window_ + (j - base_);
     if (cand[0] == cur[0] && cand[1] == cur[1] && cand[2] == cur[2]) {

@@ -26,6 +26,11 @@ class qorMatchFinder_t {
   // (aOffset unchanged) when the longest match is shorter than aMinLeng.
   int find(int aCur, int aRunLeng, int aMinLeng, int& aOffset);
 
+  // Passes over the positions from aCur (below aStop) that are sure literals: no zero, rle
+  // or word candidate, no match of 4 within 1024 and no match of 3 within 255 (so none that
+  // scores). Returns the first position it cannot decide; find() takes over from there.
+  int skipLiterals(int aCur, int aStop);
+
  private:
   struct Run_t {
     int end;      // absolute offset of the first byte after the run
@@ -34,7 +39,13 @@ class qorMatchFinder_t {
     int prev;     // index of the previous run with the same key hash (absolute count)
   };
 
-  void insertUpTo(int aAbsCur);
+  // Enters the positions before aAbsCur (the last 1024 of them) into the tables.
+  void insertUpTo(int aAbsCur) {
+    if (nextInsert_ < aAbsCur) insertRange(aAbsCur);
+  }
+  void insertRange(int aAbsCur);
+  void insert4(const unsigned char* aAt, int aAbs, uint32_t aFirst4);
+  void insert3(int aAbs, uint32_t aFirst3);
   void addRun(const unsigned char* aLast, int aAbsEnd);
   int matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom, int aCap) const;
   int findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, int& aOffset);
