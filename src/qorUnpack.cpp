@@ -17,14 +17,14 @@ const int kExitUsage = 2;
 const char kUsage[] =
     "usage: qorUnpack list ARCHIVE\n"
     "       qorUnpack test ARCHIVE\n"
-    "       qorUnpack extract ARCHIVE [-C DIR] [-f]\n"
+    "       qorUnpack extract ARCHIVE [-C DIR] [-f] [--no-verify]\n"
     "       qorUnpack --version\n";
 
 struct qorUnpackArgs_t {
   const char* command = nullptr;
   const char* archive = nullptr;
   const char* dir = ".";
-  bool force = false;
+  qorExtractOptions_t extract;
 };
 
 int UsageError(const char* aFormat, const char* aArg) {
@@ -49,7 +49,9 @@ int ParseArgs(int argc, char** argv, qorUnpackArgs_t& aArgs) {
       if (i + 1 >= argc) return UsageError("%s needs a directory", arg);
       aArgs.dir = argv[++i];
     } else if (extract && strcmp(arg, "-f") == 0) {
-      aArgs.force = true;
+      aArgs.extract.force = true;
+    } else if (extract && strcmp(arg, "--no-verify") == 0) {
+      aArgs.extract.verify = false;
     } else if (arg[0] == '-' && arg[1] != '\0') {
       return UsageError("unknown option '%s'", arg);
     } else if (aArgs.archive != nullptr) {
@@ -68,7 +70,7 @@ int Run(const qorUnpackArgs_t& aArgs) {
   } else if (strcmp(aArgs.command, "test") == 0) {
     if (UnpackTest(aArgs.archive, stdout) > 0) return kExitFailure;
   } else {
-    UnpackExtract(aArgs.archive, aArgs.dir, aArgs.force);
+    UnpackExtract(aArgs.archive, aArgs.dir, aArgs.extract);
   }
   return kExitSuccess;
 }

@@ -63,7 +63,8 @@ PortString_t ArchiveStem(const PortString_t& aArchive) {
 
 }  // namespace
 
-void UnpackExtract(const PortString_t& aArchive, const PortString_t& aDir, bool aForce) {
+void UnpackExtract(const PortString_t& aArchive, const PortString_t& aDir,
+                   const qorExtractOptions_t& aOptions) {
   qorArchiveReader_t reader(aArchive);
   // The structure is checked whole first, so that a damaged archive writes nothing at all.
   while (reader.Next()) {
@@ -74,7 +75,7 @@ void UnpackExtract(const PortString_t& aArchive, const PortString_t& aDir, bool 
 
   const PortString_t stem = ArchiveStem(aArchive);
   const PortString_t resp_name = stem + ".ls";
-  qorExtractDir_t out_dir(aDir, aForce);
+  qorExtractDir_t out_dir(aDir, aOptions.force);
   out_dir.Reserve(resp_name);
   out_dir.Reserve(stem + ".LB");  // qorLink truncates it first: no entry may be read from it
 
@@ -95,7 +96,7 @@ void UnpackExtract(const PortString_t& aArchive, const PortString_t& aDir, bool 
         throw reader.Describe(BadBodyProblem(e));
       }
       // A payload from another encoder expands fine but would not come back from qorLink.
-      if (!RecompressesToBody(reader, expanded)) plan = RawPlan(e.index);
+      if (aOptions.verify && !RecompressesToBody(reader, expanded)) plan = RawPlan(e.index);
     }
     const PortString_t path = out_dir.Place(e.index, plan.name);
     PortFileStream_t out;

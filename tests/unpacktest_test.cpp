@@ -34,7 +34,9 @@ Outcome_t TestAndExtract(const LinkTempDir_t& aDir, const std::string& aBytes, F
   WriteBytes(path, aBytes);
   Outcome_t outcome{UnpackTest(path.c_str(), aSink), true};
   try {
-    UnpackExtract(path.c_str(), (aDir / "out").c_str(), true);
+    qorExtractOptions_t options;
+    options.force = true;
+    UnpackExtract(path.c_str(), (aDir / "out").c_str(), options);
   } catch (const PortString_t&) {
     outcome.extracted = false;
   } catch (const char*) {
