@@ -59,6 +59,7 @@ void qorExtractDir_t::Create(PortFileStream_t& aStream, const PortString_t& aRel
   const PortString_t path = FullPath(aRelPath);
   struct stat st;
   if (lstat(path.c_str(), &st) == 0) {
+    if (source.IsSameAs(path)) Fail(path, "is the archive being extracted");
     if (!force) Fail(path, "already exists (-f overwrites)");
     if (S_ISDIR(st.st_mode)) Fail(path, "is a directory");
     // Removing the old entry first means a symbolic link is replaced, not written through.

@@ -10,6 +10,7 @@
 
 #include "port/src/filestream.h"
 #include "port/src/string.h"
+#include "src/outputguard.h"
 
 class qorExtractDir_t {
  public:
@@ -18,6 +19,8 @@ class qorExtractDir_t {
 
   // Keeps a top-level name for the caller's own use (the response file, the rebuilt archive).
   void Reserve(const PortString_t& aName);
+  // Create refuses this file (the archive being read) under any name, even when forced.
+  void Protect(const PortString_t& aFile) { source = qorFileIdentity_t(aFile); }
   // The path, relative to the directory, for entry aIndex's file named aName (a name that
   // IsSafeEntryName accepts): aName itself, or "NNNN/aName" when aName is taken, the
   // subdirectory then being created. Names are compared ignoring letter case, so that the
@@ -34,6 +37,7 @@ class qorExtractDir_t {
 
   PortString_t dir;
   bool force;
+  qorFileIdentity_t source;
   std::set<std::string> taken;  // top-level names, lower-cased
 };
 

@@ -76,6 +76,7 @@ void UnpackExtract(const PortString_t& aArchive, const PortString_t& aDir,
   const PortString_t stem = ArchiveStem(aArchive);
   const PortString_t resp_name = stem + ".ls";
   qorExtractDir_t out_dir(aDir, aOptions.force);
+  out_dir.Protect(aArchive);
   out_dir.Reserve(resp_name);
   out_dir.Reserve(stem + ".LB");  // qorLink truncates it first: no entry may be read from it
 

@@ -61,6 +61,14 @@ TEST(ExtractDir, ExistingFilesAreReplacedOnlyWhenForced) {
   strm.WriteBuffer("new", 3);
   strm.Close();
   EXPECT_EQ(ReadBytes(tmp / "out/a.dat"), "new");
+
+  // Not even forced: the archive being read, reached under another name.
+  tmp.Put("out/a.LB", "archive");
+  ASSERT_EQ(symlink("a.LB", (tmp / "out/link").c_str()), 0);
+  force.Protect((tmp / "out/link").c_str());
+  EXPECT_EQ(CaughtText([&] { force.Create(strm, "a.LB"); }),
+            tmp / "out/a.LB: is the archive being extracted");
+  EXPECT_EQ(ReadBytes(tmp / "out/a.LB"), "archive");
 }
 
 TEST(ExtractDir, SymbolicLinksAreNeverFollowed) {

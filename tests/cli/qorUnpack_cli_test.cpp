@@ -267,6 +267,15 @@ TEST(QorUnpackCli, ExistingFilesAreReplacedOnlyWithForce) {
   run = Unpack(dir, {"extract", "-f", "a.LB", "-C", "x"});
   EXPECT_EQ(run.status, 0) << run.err;
   EXPECT_EQ(ReadBytes(dir / "x/a.dat"), "hello");
+
+  // An entry named like the archive itself never replaces it, forced or not.
+  dir.Put("out/keep", "");
+  ASSERT_EQ(RunTool(QOR_LINK_BIN, {"a.ls", "-o", "out/a.dat"}, dir.Path()).status, 0);
+  const std::string archive = ReadBytes(dir / "out/a.dat");
+  run = Unpack(dir, {"extract", "-f", "out/a.dat", "-C", "out"});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "qorUnpack: out/a.dat: is the archive being extracted\n");
+  EXPECT_EQ(ReadBytes(dir / "out/a.dat"), archive);
 }
 
 TEST(QorUnpackCli, UsageErrorsExitWithTwo) {
