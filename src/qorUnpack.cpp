@@ -99,6 +99,5 @@ int main(int argc, char** argv) {
   } catch (const char* text) {
     fprintf(stderr, "qorUnpack: %s\n", text);
   }
-  fflush(stdout);
   return kExitFailure;
 }
