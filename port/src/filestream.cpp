@@ -61,6 +61,11 @@ const PortString_t& PortFileStream_t::GetDescription() const {
 int PortFileStream_t::Write(const void* aPtr, int aLength) {
   CheckWritable();
   if (aLength < 0) Error(3);
+  // A file written past the signed 32-bit unit could not be measured or read back by any
+  // stream, so the write that would cross it is refused like a position beyond it. A pipe
+  // has no position (ftello fails) and nothing to read back; it takes any amount.
+  const off_t position = ftello(fileHandle);
+  if (position > INT32_MAX - static_cast<off_t>(aLength)) Error(12);
   const size_t written = std::fwrite(aPtr, 1, static_cast<size_t>(aLength), fileHandle);
   if (std::ferror(fileHandle)) Error(8);
   return static_cast<int>(written);

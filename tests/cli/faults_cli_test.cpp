@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <string>
 #include <vector>
@@ -76,6 +77,24 @@ TEST(LinkFaults, FullDeviceIsAWriteErrorAndStays) {
   EXPECT_EQ("", run.out);
   EXPECT_TRUE(IsCharDevice("/dev/full"));
   EXPECT_TRUE(IsCharDevice(dir / "full.LB")) << "the link to the device is kept";
+}
+
+TEST(LinkFaults, ArchiveIntoAPipe) {
+  // The archive is written strictly front to back, so a FIFO takes it whole.
+  LinkTempDir_t dir;
+  dir.Put("a.dat", "hello");
+  dir.Put("list.ls", "%nocomp\na.dat\n");
+  ASSERT_EQ(0, mkfifo((dir / "pipe.LB").c_str(), 0600));
+  FILE* reader = popen(("cat " + dir / "pipe.LB").c_str(), "r");
+  ASSERT_NE(nullptr, reader);
+  ToolRun_t run = Link(dir, {"list.ls", "-o", "pipe.LB"});
+  std::string received;
+  char buffer[256];
+  for (size_t got; (got = fread(buffer, 1, sizeof buffer, reader)) > 0;) received.append(buffer, got);
+  pclose(reader);
+  EXPECT_EQ(0, run.status);
+  EXPECT_EQ("", run.err);
+  EXPECT_EQ(StoredEntry("hello", "DAT") + EndRecord(), received);
 }
 
 TEST(LinkFaults, MissingOutputDirectoryCreatesNothing) {
