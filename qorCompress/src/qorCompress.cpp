@@ -77,7 +77,7 @@ void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int
   runOpen_ = false;
   wordFrom_ = wordEnd_ = 0;
   wordLimit_ = -1;
-  qorMatchFinder_t finder(length);
+  qorMatchFinder_t finder;
   finder_ = &finder;
   finder.setWindow(buffer_, srcBase_, srcLimit_);
 

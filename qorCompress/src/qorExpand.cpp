@@ -37,15 +37,13 @@ inline void sdCopy(unsigned char* aDst, int aOffset, int aLeng) {
   }
 }
 
-// Owns the two buffers for one expand() call.
-struct Buffers_t {
-  unsigned char* in = new unsigned char[kInBlock + kMaxDirective + kSlack];
-  unsigned char* out = nullptr;
-  Buffers_t() { out = new unsigned char[kHistory + kOutBlock + kMaxOutput + kSlack]; }
-  ~Buffers_t() {
-    delete[] out;
-    delete[] in;
-  }
+// A buffer owned for one expand() call.
+struct ByteBuffer_t {
+  unsigned char* const p;
+  explicit ByteBuffer_t(int aSize) : p(new unsigned char[aSize]) {}
+  ~ByteBuffer_t() { delete[] p; }
+  ByteBuffer_t(const ByteBuffer_t&) = delete;
+  ByteBuffer_t& operator=(const ByteBuffer_t&) = delete;
 };
 
 }  // namespace
@@ -57,28 +55,31 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
     if (realSize != 0) invalid();
     return;
   }
-  Buffers_t buf;
-  int in_remain = payloadLength;         // payload bytes not yet read into buf.in
-  const unsigned char* in = buf.in;
-  const unsigned char* in_end = buf.in;
-  unsigned char* const out_start = buf.out + kHistory;
+  // Neither buffer is larger than the payload or the output needs.
+  const int in_size = payloadLength < kInBlock + kMaxDirective ? payloadLength : kInBlock + kMaxDirective;
+  const int out_size = realSize < kOutBlock + kMaxOutput ? realSize : kOutBlock + kMaxOutput;
+  ByteBuffer_t in_buf(in_size + kSlack);
+  ByteBuffer_t out_buf(kHistory + out_size + kSlack);
+  int in_remain = payloadLength;         // payload bytes not yet read into in_buf.p
+  const unsigned char* in = in_buf.p;
+  const unsigned char* in_end = in_buf.p;
+  unsigned char* const out_start = out_buf.p + kHistory;
   unsigned char* out = out_start;
   unsigned char* out_flushed = out_start;  // bytes before it have gone to dstStrm
   int64_t out_total = 0;                   // bytes expanded before out_start
   for (;;) {
     if (in_end - in < kMaxDirective && in_remain > 0) {
       const int kept = static_cast<int>(in_end - in);
-      std::memmove(buf.in, in, kept);
-      const int count = kInBlock + kMaxDirective - kept < in_remain ? kInBlock + kMaxDirective - kept
-                                                                    : in_remain;
-      srcStrm.ReadBuffer(buf.in + kept, count);
+      std::memmove(in_buf.p, in, kept);
+      const int count = in_size - kept < in_remain ? in_size - kept : in_remain;
+      srcStrm.ReadBuffer(in_buf.p + kept, count);
       in_remain -= count;
-      in = buf.in;
-      in_end = buf.in + kept + count;
+      in = in_buf.p;
+      in_end = in_buf.p + kept + count;
     }
     if (out - out_start >= kOutBlock) {
       dstStrm.WriteBuffer(out_flushed, static_cast<int>(out - out_flushed));
-      std::memmove(buf.out, out - kHistory, kHistory);
+      std::memmove(out_buf.p, out - kHistory, kHistory);
       out_total += out - out_start;
       out = out_flushed = out_start;
     }
@@ -136,5 +137,5 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
   }
   if (in != in_end || in_remain != 0) invalid();
   if (out_total + (out - out_start) != realSize) invalid();
-  dstStrm.WriteBuffer(out_flushed, static_cast<int>(out - out_flushed));
+  if (out > out_flushed) dstStrm.WriteBuffer(out_flushed, static_cast<int>(out - out_flushed));
 }

@@ -8,6 +8,10 @@ const int kMaxOffset = 1024;
 const int kMaxMatch = 2048;
 const int kNearMax = 255;
 const int kRunRing = 512;  // runs of 4+ bytes ending in the last 1024 bytes number at most 206
+// Only the last 1024 positions (255 for the 3-byte table) are ever live: small tables do,
+// and stay in the first-level cache.
+const int kBits4 = 12;
+const int kBits3 = 10;
 
 // Little-endian by construction; compilers make one load of it.
 inline uint32_t load32(const unsigned char* aPtr) {
@@ -32,17 +36,12 @@ inline int hashOf(uint32_t aValue, int aBits) {
 
 }  // namespace
 
-qorMatchFinder_t::qorMatchFinder_t(int aLength)
+qorMatchFinder_t::qorMatchFinder_t()
     : window_(nullptr), base_(0), limit_(0), nextInsert_(0), runCount_(0) {
-  // Only the last 1024 positions are ever live, so small tables suffice; short sources get
-  // smaller ones still, since they are cleared on every call.
-  const bool small = aLength <= 8192;
-  hashBits4_ = small ? 10 : 12;
-  hashBits3_ = small ? 8 : 10;
-  const int run_heads = 1 << hashBits3_;
+  const int run_heads = 1 << kBits3;
   // Each head table has one slot more: the chain of run positions, which no search walks.
-  const int heads4 = (1 << hashBits4_) + 1;
-  const int heads3 = (1 << hashBits3_) + 1;
+  const int heads4 = (1 << kBits4) + 1;
+  const int heads3 = (1 << kBits3) + 1;
   head4_ = new int[heads4 + kMaxOffset + heads3 + (kNearMax + 1) + run_heads];
   prev4_ = head4_ + heads4;
   head3_ = prev4_ + kMaxOffset;
@@ -66,40 +65,44 @@ void qorMatchFinder_t::setWindow(const unsigned char* aWindow, int aBase, int aL
   limit_ = aLimit;
 }
 
-// A position whose first 4 (or 3) bytes are all equal lies in a run. Runs are listed once
-// instead (addRun), so such positions go to the spare slot: long runs make no long chains.
-inline void qorMatchFinder_t::insert4(const unsigned char* aAt, int aAbs, uint32_t aFirst4) {
-  const bool in_run = aFirst4 == (aFirst4 & 0xFF) * 0x01010101u;
-  const int h = in_run ? 1 << hashBits4_ : hashOf(aFirst4, hashBits4_);
-  prev4_[aAbs & (kMaxOffset - 1)] = head4_[h];
-  head4_[h] = aAbs;
-  if (in_run && aAbs + 4 < base_ + limit_ && aAt[4] != aAt[0]) addRun(aAt + 3, aAbs + 4);
-}
-
-inline void qorMatchFinder_t::insert3(int aAbs, uint32_t aFirst3) {
-  const bool in_run = aFirst3 == (aFirst3 & 0xFF) * 0x010101u;
-  const int h = in_run ? 1 << hashBits3_ : hashOf(aFirst3, hashBits3_);
-  prev3_[aAbs & kNearMax] = head3_[h];
-  head3_[h] = aAbs;
-}
-
 void qorMatchFinder_t::insertRange(int aAbsCur) {
   int p = nextInsert_ > aAbsCur - kMaxOffset ? nextInsert_ : aAbsCur - kMaxOffset;
   nextInsert_ = aAbsCur;
+  // Locals: stores into the tables would otherwise make the compiler reload the members.
   const unsigned char* const window = window_ - base_;  // indexed by absolute offsets
   const int abs_limit = base_ + limit_;
+  int* const head4 = head4_;
+  int* const prev4 = prev4_;
+  int* const head3 = head3_;
+  int* const prev3 = prev3_;
+  const int bits4 = kBits4;
+  const int bits3 = kBits3;
   // The 4-byte chains need every position of the last 1024 that has 4 bytes, the 3-byte
-  // table those of the last 255 that have 3.
+  // table those of the last 255 that have 3. A position whose first 4 (or 3) bytes are all
+  // equal lies in a run; runs are listed once instead (addRun), and such positions go to the
+  // spare slot of the head table, which no search walks: long runs make no long chains.
   const int stop4 = abs_limit - 3 < aAbsCur ? abs_limit - 3 : aAbsCur;
   const int near_from = aAbsCur - kNearMax;
-  for (; p < stop4 && p < near_from; ++p) insert4(window + p, p, load32(window + p));
   for (; p < stop4; ++p) {
     const uint32_t v = load32(window + p);
-    insert4(window + p, p, v);
-    insert3(p, v & 0xFFFFFF);
+    const bool in_run = v == (v & 0xFF) * 0x01010101u;
+    const int h4 = in_run ? 1 << bits4 : hashOf(v, bits4);
+    prev4[p & (kMaxOffset - 1)] = head4[h4];
+    head4[h4] = p;
+    if (in_run && p + 4 < abs_limit && window[p + 4] != window[p]) addRun(window + p + 3, p + 4);
+    if (p >= near_from) {
+      const uint32_t v3 = v & 0xFFFFFF;
+      const int h3 = v3 == (v & 0xFF) * 0x010101u ? 1 << bits3 : hashOf(v3, bits3);
+      prev3[p & kNearMax] = head3[h3];
+      head3[h3] = p;
+    }
   }
   for (; p < aAbsCur; ++p) {
-    if (p >= near_from && p + 2 < abs_limit) insert3(p, load24(window + p));
+    if (p < near_from || p + 2 >= abs_limit) continue;
+    const uint32_t v3 = load24(window + p);
+    const int h3 = v3 == (v3 & 0xFF) * 0x010101u ? 1 << bits3 : hashOf(v3, bits3);
+    prev3[p & kNearMax] = head3[h3];
+    head3[h3] = p;
   }
 }
 
@@ -110,8 +113,8 @@ int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
   int* const prev4 = prev4_;
   int* const head3 = head3_;
   int* const prev3 = prev3_;
-  const int bits4 = hashBits4_;
-  const int bits3 = hashBits3_;
+  const int bits4 = kBits4;
+  const int bits3 = kBits3;
   // Four bytes are read from each position.
   const int stop = base_ + (aStop < limit_ - 3 ? aStop : limit_ - 3);
   int abs = base_ + aCur;
@@ -145,7 +148,7 @@ void qorMatchFinder_t::addRun(const unsigned char* aLast, int aAbsEnd) {
   int leng = 4;
   while (leng < max_leng && aLast[-leng] == aLast[0]) ++leng;
   const int key = aLast[0] << 8 | aLast[1];
-  const int h = hashOf(static_cast<uint32_t>(key), hashBits3_);
+  const int h = hashOf(static_cast<uint32_t>(key), kBits3);
   Run_t& run = runs_[runCount_ & (kRunRing - 1)];
   run.end = aAbsEnd;
   run.leng = leng;
@@ -189,7 +192,7 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
   const int lowest = abs_cur - kMaxOffset;
   int best = aMinLeng - 1;
   int best_pos = -1;
-  for (int i = headRun_[hashOf(static_cast<uint32_t>(key), hashBits3_)];
+  for (int i = headRun_[hashOf(static_cast<uint32_t>(key), kBits3)];
        i >= 0 && i >= runCount_ - kRunRing;) {
     const Run_t& run = runs_[i & (kRunRing - 1)];
     const int j = run.end - aRunLeng;
@@ -217,7 +220,7 @@ int qorMatchFinder_t::findChain(int aCur, int aMinLeng, int aCap, int& aOffset) 
   const int lowest = abs_cur - kMaxOffset;
   int best = (aMinLeng > 4 ? aMinLeng : 4) - 1;
   int best_pos = -1;
-  for (int j = head4_[hashOf(load32(cur), hashBits4_)]; j >= lowest;
+  for (int j = head4_[hashOf(load32(cur), kBits4)]; j >= lowest;
        j = prev4_[j & (kMaxOffset - 1)]) {
     const unsigned char* cand = window_ + (j - base_);
     // A longer match must agree on the 4 bytes ending at the current best length.
@@ -238,7 +241,7 @@ int qorMatchFinder_t::findNear3(int aCur, int& aOffset) {
   const unsigned char* cur = window_ + aCur;
   const int abs_cur = base_ + aCur;
   const int lowest = abs_cur - kNearMax;
-  for (int j = head3_[hashOf(load24(cur), hashBits3_)]; j >= lowest;
+  for (int j = head3_[hashOf(load24(cur), kBits3)]; j >= lowest;
        j = prev3_[j & kNearMax]) {
     const unsigned char* cand = window_ + (j - base_);
     if (cand[0] == cur[0] && cand[1] == cur[1] && cand[2] == cur[2]) {

@@ -9,8 +9,8 @@
 
 class qorMatchFinder_t {
  public:
-  // Allocates the tables (about 100 KB, fewer for short sources); released by the destructor.
-  explicit qorMatchFinder_t(int aLength);
+  // Allocates the tables (about 40 KB); the destructor releases them.
+  qorMatchFinder_t();
   ~qorMatchFinder_t();
   qorMatchFinder_t(const qorMatchFinder_t&) = delete;
   qorMatchFinder_t& operator=(const qorMatchFinder_t&) = delete;
@@ -44,8 +44,6 @@ class qorMatchFinder_t {
     if (nextInsert_ < aAbsCur) insertRange(aAbsCur);
   }
   void insertRange(int aAbsCur);
-  void insert4(const unsigned char* aAt, int aAbs, uint32_t aFirst4);
-  void insert3(int aAbs, uint32_t aFirst3);
   void addRun(const unsigned char* aLast, int aAbsEnd);
   int matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom, int aCap) const;
   int findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, int& aOffset);
@@ -57,8 +55,6 @@ class qorMatchFinder_t {
   int limit_;
   int nextInsert_;  // absolute offset of the first position not yet entered
 
-  int hashBits4_;
-  int hashBits3_;
   int* head4_;  // newest position per hash of 4 bytes not all equal
   int* prev4_;  // ring of 1024: the previous position with the same hash
   int* head3_;  // newest position per hash of 3 bytes not all equal

@@ -54,6 +54,7 @@ std::string IncompressibleBytes(int aLength, uint32_t aSeed) {
   while (static_cast<int>(bytes.size()) < aLength) {
     const int i = static_cast<int>(bytes.size());
     const unsigned char b = static_cast<unsigned char>(1 + rng() % 255);
+    if (i > 0 && b == static_cast<unsigned char>(bytes[i - 1])) continue;  // no runs
     if (i < 2) {
       bytes += static_cast<char>(b);
       continue;

@@ -11,7 +11,8 @@ std::string Hex(const char* aText);
 std::string CompressString(const std::string& aInput);
 // Raises what qorExpander_t::expand raises.
 std::string ExpandString(const std::string& aPayload, int aRealSize);
-// Nonzero bytes in which no 3 bytes recur within 1024 bytes: nothing for the compressor to find.
+// Nonzero bytes, no two neighbours equal, no 3 bytes recurring within 1024 bytes: nothing
+// for the compressor to find.
 std::string IncompressibleBytes(int aLength, uint32_t aSeed);
 
 #endif
