@@ -26,6 +26,8 @@ const unsigned char kFarSd = 0x80;
 const unsigned char kWord = 0xA0;
 const unsigned char kEndMark = 0xFF;
 
+const bool kLittleEndian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
+
 enum Kind_t { kNone, kKindZero, kKindRle, kKindSd, kKindWord };
 
 inline int zeroScore(int aLeng) { return aLeng <= kShortMax ? aLeng - 1 : aLeng - 2; }
@@ -216,10 +218,17 @@ int qorCompressor_t::longRunLeng() {
     while (i + 8 <= stop) {
       uint64_t v;
       std::memcpy(&v, buffer_ + i, sizeof v);
-      if (v != pattern) break;
+      if (v != pattern) {
+        // The first differing byte, in memory order.
+        const uint64_t diff = v ^ pattern;
+        i += (kLittleEndian ? __builtin_ctzll(diff) : __builtin_clzll(diff)) >> 3;
+        break;
+      }
       i += 8;
     }
-    while (i < stop && buffer_[i] == b) ++i;
+    if (i + 8 > stop) {
+      while (i < stop && buffer_[i] == b) ++i;
+    }
     runEnd_ = srcBase_ + i;
     runOpen_ = i == stop && !(srcRemain_ == 0 && stop == srcLimit_);
   }
@@ -310,9 +319,17 @@ void qorCompressor_t::flushDstBuff() {
 
 void qorCompressor_t::flushNormalData() {
   const int leng = srcIndex_ - normalIndex_;
-  if (leng > 0) {
+  if (leng <= 0) return;
+  // Most runs are short: with room on both sides, one fixed-size copy (the bytes past the
+  // run are overwritten later or never handed out).
+  if (leng <= kShortMax && dstIndex_ + 1 + kShortMax + 1 < kDstSize &&
+      normalIndex_ + kShortMax + 1 <= srcLimit_) {
+    dstBuffer_[dstIndex_] = static_cast<unsigned char>(kNormal | leng);
+    std::memcpy(dstBuffer_ + dstIndex_ + 1, buffer_ + normalIndex_, kShortMax + 1);
+    dstIndex_ += 1 + leng;
+  } else {
     putDirective(kNormal, leng);
     putBuff(buffer_ + normalIndex_, leng);
-    normalIndex_ = srcIndex_;
   }
+  normalIndex_ = srcIndex_;
 }

@@ -14,7 +14,8 @@ const int kMaxDirective = 3 + 0xFFFF;      // directive byte, long length, 65535
 const int kMaxOutput = 2 * 0xFFFF;         // a word directive of 65535 units
 const int kInBlock = 0x40000;
 const int kOutBlock = 0x40000;
-const int kSlack = 16;                     // wide copies may run this far past their end
+const int kShort = 32;                     // lengths copied with fixed-size moves
+const int kSlack = 64;                     // fixed-size moves may run this far past their end
 
 [[noreturn]] void invalid() { PortErrorThrow(kInvalidFormat); }
 
@@ -27,13 +28,27 @@ inline uint64_t load64(const unsigned char* aPtr) {
 inline void store64(unsigned char* aPtr, uint64_t aValue) { std::memcpy(aPtr, &aValue, sizeof aValue); }
 
 // Copies aLeng bytes from aOffset back; an overlapping copy repeats the last aOffset bytes.
-// May write up to 7 bytes past the end.
+// Moves of up to 16 bytes never read what they write, since each is no longer than the
+// offset. May write up to 15 bytes past the end.
 inline void sdCopy(unsigned char* aDst, int aOffset, int aLeng) {
   const unsigned char* src = aDst - aOffset;
-  if (aOffset >= 8) {
-    for (int k = 0; k < aLeng; k += 8) store64(aDst + k, load64(src + k));
+  if (aOffset >= 16) {
+    for (int k = 0; k < aLeng; k += 16) std::memcpy(aDst + k, src + k, 16);
+  } else if (aOffset >= 8) {
+    for (int k = 0; k < aLeng; k += 8) std::memcpy(aDst + k, src + k, 8);
+  } else if (aOffset == 1) {
+    std::memset(aDst, src[0], aLeng);
   } else {
     for (int k = 0; k < aLeng; ++k) aDst[k] = src[k];
+  }
+}
+
+// Fills aLeng bytes with aValue; may write up to kShort - 1 bytes past the end.
+inline void fill(unsigned char* aDst, unsigned char aValue, int aLeng) {
+  if (aLeng <= kShort) {
+    std::memset(aDst, aValue, kShort);
+  } else {
+    std::memset(aDst, aValue, aLeng);
   }
 }
 
@@ -102,15 +117,20 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
     switch (code) {
       case 0:
         if (avail < leng) invalid();
-        std::memcpy(out, in, leng);
+        // The input buffer's slack makes the fixed-size read safe.
+        if (leng <= kShort) {
+          std::memcpy(out, in, kShort);
+        } else {
+          std::memcpy(out, in, leng);
+        }
         in += leng;
         break;
       case 1:
-        std::memset(out, 0, leng);
+        fill(out, 0, leng);
         break;
       case 2:
         if (avail < 1) invalid();
-        std::memset(out, *in++, leng);
+        fill(out, *in++, leng);
         break;
       case 3:
       case 4: {

@@ -7,6 +7,7 @@ namespace {
 const int kMaxOffset = 1024;
 const int kMaxMatch = 2048;
 const int kNearMax = 255;
+const bool kLittleEndian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
 const int kRunRing = 512;  // runs of 4+ bytes ending in the last 1024 bytes number at most 206
 // Only the last 1024 positions (255 for the 3-byte table) are ever live: small tables do,
 // and stay in the first-level cache.
@@ -162,7 +163,7 @@ int qorMatchFinder_t::matchLeng(const unsigned char* aA, const unsigned char* aB
   int k = aFrom;
   while (k + 8 <= aCap) {
     const uint64_t diff = load64(aA + k) ^ load64(aB + k);
-    if (diff != 0) return k + (__builtin_ctzll(diff) >> 3);
+    if (diff != 0) return k + ((kLittleEndian ? __builtin_ctzll(diff) : __builtin_clzll(diff)) >> 3);
     k += 8;
   }
   while (k < aCap && aA[k] == aB[k]) ++k;
