@@ -94,8 +94,8 @@ void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int
     const int stop = srcRemain_ > 0 ? srcLimit_ - kRefillAt : srcLimit_;
     while (srcIndex_ < stop) {
       const unsigned char* at = buffer_ + srcIndex_;
-      // The skipper's own first test, here to save a call where it fails.
-      if (srcLimit_ - srcIndex_ > 3 && at[1] != at[0] && (at[1] != 0 || at[3] != 0)) {
+      // The skipper's own first test, here too to save a call where it fails.
+      if (srcLimit_ - srcIndex_ > 3 && qorMatchFinder_t::mayBeLiteral(at)) {
         const int normal_stop = normalIndex_ + kMaxNormal;
         const int next = finder.skipLiterals(srcIndex_, stop < normal_stop ? stop : normal_stop);
         if (next != srcIndex_) {

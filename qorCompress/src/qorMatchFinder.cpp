@@ -121,8 +121,7 @@ int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
   int abs = base_ + aCur;
   for (; abs < stop; ++abs) {
     const unsigned char* s = window + abs;
-    // A zero or rle run needs the next byte equal, a word run of 2 units the high bytes 0.
-    if (s[1] == s[0] || (s[1] == 0 && s[3] == 0)) break;
+    if (!mayBeLiteral(s)) break;
     const uint32_t v = load32(s);
     const int h4 = hashOf(v, bits4);
     const int h3 = hashOf(v & 0xFFFFFF, bits3);

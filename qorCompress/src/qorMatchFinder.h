@@ -31,6 +31,13 @@ class qorMatchFinder_t {
   // scores). Returns the first position it cannot decide; find() takes over from there.
   int skipLiterals(int aCur, int aStop);
 
+  // False when the 4 bytes from aAt start a zero run, an rle run or a word run of 2 units:
+  // then the position is no literal.
+  static bool mayBeLiteral(const unsigned char* aAt) {
+    return aAt[0] == 0 ? aAt[1] != 0
+                       : (aAt[1] != aAt[0] || aAt[2] != aAt[0]) && (aAt[1] != 0 || aAt[3] != 0);
+  }
+
  private:
   struct Run_t {
     int end;      // absolute offset of the first byte after the run
