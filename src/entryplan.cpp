@@ -7,7 +7,6 @@
 
 namespace {
 
-const int kMergePlain = 3;
 
 bool IsNameByte(unsigned char aCh) {
   return aCh >= 0x20 && aCh != 0x7F && aCh != ' ' && aCh != '/' && aCh != '\\' && aCh != '#' &&
@@ -28,7 +27,7 @@ bool NameBlockIsCanonical(const qorArchiveEntry_t& aEntry, const PortString_t& a
 // Whether qorLink, listing a file of this name, writes a plain entry with this magic code.
 bool NameGivesMagic(const PortString_t& aName, uint32_t aMagicCode) {
   PortString_t ext = PortFilename_t(aName).GetExtName();
-  return QorMergeModeOfExt(ext) == kMergePlain && QorMagicCodeOfExt(ext) == aMagicCode;
+  return QorMergeModeOfExt(ext) == kQorMergePlain && QorMagicCodeOfExt(ext) == aMagicCode;
 }
 
 }  // namespace

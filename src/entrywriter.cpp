@@ -1,6 +1,5 @@
 #include "src/entrywriter.h"
 
-#include <cctype>
 #include <cstdint>
 #include <cstring>
 
@@ -12,7 +11,6 @@
 namespace {
 
 const uint8_t kBodyCompressed = 1;
-const int kMagicLength = 4;
 const int kErrIllegalFilename = 14;
 const int kErrInvalidFormat = 15;
 const int kErrRead = 9;
@@ -37,17 +35,6 @@ PortStreamUnit_t EntryRest(PortStream_t& src_strm, const qorStdFileHeader_t& hea
   uint32_t rest = header.fileSize - static_cast<uint32_t>(skip);
   if (rest > static_cast<uint32_t>(INT32_MAX)) src_strm.Error(kErrRead);
   return static_cast<PortStreamUnit_t>(rest);
-}
-
-// The extension's first four characters after the dot, upper-cased, in file order.
-uint32_t MagicCodeOf(const PortFilename_t& src_name) {
-  PortString_t ext = src_name.GetExtName();
-  uint32_t magic = 0;
-  for (int i = 0; i < kMagicLength && i + 1 < ext.GetLength(); ++i) {
-    uint32_t ch = static_cast<unsigned char>(toupper(static_cast<unsigned char>(ext[i + 1])));
-    magic |= ch << (8 * i);
-  }
-  return magic;
 }
 
 // Fills `block` with the base name and zero bytes; returns the block's length (16, 32 or 48).
@@ -77,7 +64,7 @@ void WritePlainFile(PortStream_t& dst_strm, PortStream_t& src_strm, PortFilename
   qorStdFileHeader_t header = {};
   header.fileType = kQorFileTypePlain;
   header.fileSize = static_cast<uint32_t>(src_strm.GetLength()) + kQorHeaderSize;
-  header.magicCode = MagicCodeOf(src_name);
+  header.magicCode = QorMagicCodeOfExt(src_name.GetExtName());
   NormalWrite(dst_strm, src_strm, src_name, header, token, comp_default, fname_default);
 }
 

@@ -10,14 +10,6 @@
 #include "port/src/stringtoken.h"
 #include "src/qorArchive.h"
 
-// How a listed file goes into the archive, chosen by the response-file loop from its extension.
-enum qorMergeMode_t {
-  kQorMergeOwnHeader = 0,  // starts with its own 16-byte header: kept, body stored or compressed
-  kQorMergeArchive = 1,    // an archive: its entries copied unchanged up to its end record
-  kQorMergeRaw = 2,        // copied byte for byte, no header
-  kQorMergePlain = 3,      // plain data: a new header, body stored or compressed
-};
-
 // Writes the file that `src_strm` holds (at position 0) by `merge_mode`. For the own-header
 // and plain modes the line's option words in `token` and the directive defaults apply; the
 // other modes ignore them. A header whose fileSize is below 16 + its name block raises

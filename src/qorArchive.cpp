@@ -56,9 +56,10 @@ int QorMergeModeOfExt(const PortString_t& aExt) {
   static const struct {
     const char* ext;
     int mode;
-  } kModes[] = {{".PB", 1}, {".MB", 0}, {".TB", 2}, {".AB", 0}, {".TMX", 0}};
+  } kModes[] = {{".PB", kQorMergeArchive}, {".MB", kQorMergeOwnHeader}, {".TB", kQorMergeRaw},
+                 {".AB", kQorMergeOwnHeader}, {".TMX", kQorMergeOwnHeader}};
   for (const auto& m : kModes) {
     if (CaseCompare(aExt, m.ext) == 0) return m.mode;
   }
-  return 3;
+  return kQorMergePlain;
 }

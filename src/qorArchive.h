@@ -54,6 +54,14 @@ inline int QorPadLength(uint32_t fileSize) {
   return (kQorEntryAlign - static_cast<int>(fileSize % kQorEntryAlign)) % kQorEntryAlign;
 }
 
+// How a listed file goes into the archive, chosen from its extension.
+enum qorMergeMode_t {
+  kQorMergeOwnHeader = 0,  // starts with its own 16-byte header: kept, body stored or compressed
+  kQorMergeArchive = 1,    // an archive: its entries copied unchanged up to its end record
+  kQorMergeRaw = 2,        // copied byte for byte, no header
+  kQorMergePlain = 3,      // plain data: a new header, body stored or compressed
+};
+
 // What qorLink derives from a listed file's extension (dot included, as
 // PortFilename_t::GetExtName gives it; empty without one):
 // the magic code of a plain file: the first four characters after the dot, upper-cased

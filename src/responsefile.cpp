@@ -8,16 +8,6 @@ namespace {
 
 const int kErrOpen = 7;
 
-struct qorExtMode_t {
-  const char* ext;
-  int merge_mode;
-};
-
-const qorExtMode_t kExtModes[] = {
-    {".PB", kQorMergeArchive}, {".MB", kQorMergeOwnHeader}, {".TB", kQorMergeRaw},
-    {".AB", kQorMergeOwnHeader}, {".TMX", kQorMergeOwnHeader},
-};
-
 void ApplyDirective(const PortString_t& first_word, const char* resp_name_p,
                     qorDirectiveState_t& state) {
   PortString_t word(first_word.c_str() + 1);
@@ -47,18 +37,11 @@ void LinkFile(PortStringToken_t& token, PortStream_t& dst_strm,
   // Copying the archive into itself would read what this very run is writing.
   if (archive.IsSameAs(src_name.GetFilename())) src_strm.Error(kErrOpen);
   token.erase(0);
-  WriteEntry(dst_strm, src_strm, src_name, MergeModeOf(ext), token, state.comp_default,
+  WriteEntry(dst_strm, src_strm, src_name, QorMergeModeOfExt(ext), token, state.comp_default,
              state.fname_default);
 }
 
 }  // namespace
-
-int MergeModeOf(const PortString_t& ext) {
-  for (const qorExtMode_t& entry : kExtModes) {
-    if (CaseCompare(ext, entry.ext) == 0) return entry.merge_mode;
-  }
-  return kQorMergePlain;
-}
 
 void ReadResponseFile(PortStringReader_t& reader, PortStringToken_t& token,
                       PortStream_t& dst_strm, const char* resp_name_p,

@@ -17,10 +17,6 @@ struct qorDirectiveState_t {
   int line_num = 0;
 };
 
-// The merge mode (src/entrywriter.h) of a file with extension `ext` (dot included), any case:
-// ".PB" archive, ".MB"/".AB"/".TMX" own header, ".TB" raw, anything else plain.
-int MergeModeOf(const PortString_t& ext);
-
 // Runs until `reader` is at its end. `resp_name_p` is the response-file name as typed, for
 // messages; `archive` identifies the archive being written, which cannot be listed. Throws
 // "<resp>:<line>: unknow directive <word>." (PortString_t) for an unknown directive and

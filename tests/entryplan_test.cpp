@@ -104,7 +104,9 @@ TEST(EntryPlan, OnlyEntriesQorLinkWouldWriteAgainArePlain) {
     SCOPED_TRACE(c.what);
     qorEntryPlan_t plan = PlanEntry(c.entry, c.padding_zero);
     EXPECT_EQ(plan.plain, c.plain);
-    if (c.name != nullptr) EXPECT_STREQ(plan.name.c_str(), c.name);
+    if (c.name != nullptr) {
+      EXPECT_STREQ(plan.name.c_str(), c.name);
+    }
     EXPECT_EQ(plan.compressed, c.compressed);
     EXPECT_EQ(plan.setFileName, c.set_file_name);
   }

@@ -1,11 +1,10 @@
-#include "src/responsefile.h"
+#include "src/qorArchive.h"
 
 #include "gtest/gtest.h"
-#include "src/entrywriter.h"
 
 namespace {
 
-TEST(ResponseFile, MergeModeByExtensionIgnoringCase) {
+TEST(QorArchive, MergeModeByExtensionIgnoringCase) {
   struct Case {
     const char* ext;
     int merge_mode;
@@ -15,7 +14,7 @@ TEST(ResponseFile, MergeModeByExtensionIgnoringCase) {
       {".tm", kQorMergePlain},    {".TMXA", kQorMergePlain},   {".P", kQorMergePlain},
       {"", kQorMergePlain},       {".", kQorMergePlain},       {"PB", kQorMergePlain},
   };
-  for (const Case& c : cases) EXPECT_EQ(MergeModeOf(c.ext), c.merge_mode) << c.ext;
+  for (const Case& c : cases) EXPECT_EQ(QorMergeModeOfExt(c.ext), c.merge_mode) << c.ext;
 }
 
 }  // namespace
