@@ -3,8 +3,8 @@
 # then prints where each entry starts and what its 16-byte header says.
 set -euo pipefail
 
-if [ $# -ne 1 ] || [ ! -x "$1/qorLink" ]; then
-  echo "usage: example/demo.sh BUILD_DIR   (BUILD_DIR holds a built qorLink; see 'make build')" >&2
+if [ $# -ne 1 ] || [ ! -x "$1/qorLink" ] || [ ! -x "$1/qorUnpack" ]; then
+  echo "usage: example/demo.sh BUILD_DIR   (BUILD_DIR holds the built qorLink and qorUnpack; see 'make build')" >&2
   exit 2
 fi
 build=$(cd "$1" && pwd)
@@ -38,3 +38,13 @@ while [ "$offset" -lt "$size" ]; do
   if [ "$file_size" -lt 16 ]; then echo "(no entry header here: stopping)"; break; fi
   offset=$((offset + (file_size + 63) / 64 * 64))
 done
+
+echo
+"$build/qorUnpack" list "$archive"
+echo
+"$build/qorUnpack" test "$archive"
+# The response file that extract writes rebuilds the archive byte for byte.
+rm -rf "$build/demo/extracted"
+"$build/qorUnpack" extract "$archive" -C "$build/demo/extracted"
+(cd "$build/demo/extracted" && "$build/qorLink" stage1.ls -o stage1.LB)
+cmp "$archive" "$build/demo/extracted/stage1.LB" && echo "extracted to ${build#"$PWD"/}/demo/extracted and relinked: identical"
