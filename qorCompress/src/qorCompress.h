@@ -62,10 +62,13 @@ class qorCompressor_t {
 class qorExpander_t {
  public:
   // Reads `payloadLength` bytes of payload from srcStrm's position and writes exactly
-  // `realSize` expanded bytes to dstStrm. Any malformed payload (a directive byte 0xC0-0xFE,
-  // an sd offset before the start of the output, a payload ending before its end mark or
-  // with bytes after it, an expanded size other than realSize) raises the const char*
-  // " invalid file format." (code 15). Never reads or writes outside its buffers.
+  // `realSize` expanded bytes to dstStrm, in blocks of about 256 KB. Any malformed payload
+  // (a directive byte 0xC0-0xFE, a length of 0, an sd offset of 0, above 1024 or before the
+  // start of the output, a payload ending before its end mark or with bytes after it, an
+  // expanded size other than realSize) raises the const char* " invalid file format."
+  // (code 15); blocks already written stay written. An empty payload is valid for realSize 0
+  // only. Never reads or writes outside its buffers, whatever the payload. Stream errors
+  // pass out unchanged.
   void expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int payloadLength, int realSize);
 };
 
