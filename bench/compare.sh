@@ -1,5 +1,6 @@
 #!/usr/bin/env bash
-# compare.sh CORPUS_DIR: our compressor (qorLink with %comp, a whole process like the others)
+# compare.sh CORPUS_DIR: our compressor, as a process over files (qorcompress_file) and inside
+# the link tool (qorLink with %comp: reading, compressing into memory, writing the archive),
 # against gzip -1, lz4 -1 and zstd -1 on CORPUS_DIR/freedoom2.wad and CORPUS_DIR/utf16.txt
 # (../shared/bench/make-corpus.sh builds them). One table from one run on this machine:
 # MB/s of input (1 MB = 10^6 bytes) from the median wall-clock time of RUNS runs (default 5),
@@ -14,7 +15,7 @@ work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
 cmake -S "$root" -B "$build" -DCMAKE_BUILD_TYPE=Release -DQOR_BENCH=ON -DQOR_TESTS=OFF >/dev/null
-cmake --build "$build" -j 2 --target qorLink >/dev/null
+cmake --build "$build" -j 2 --target qorLink qorcompress_file >/dev/null
 
 # Median wall-clock seconds of RUNS runs of the command given as arguments.
 median_time() {
@@ -37,9 +38,10 @@ printf '%-14s %-10s %10s %8s\n' file tool MB/s ratio
 for name in freedoom2.wad utf16.txt; do
   input=$corpus/$name
   size=$(stat -c %s "$input")
-  for tool in qorLink gzip-1 lz4-1 zstd-1; do
+  for tool in qorcompress qorLink gzip-1 lz4-1 zstd-1; do
     out=$work/out
     case $tool in
+      qorcompress) cmd=("$build/bench/qorcompress_file" "$input" "$out") ;;
       qorLink) cmd=(qor_link "$input" "$out") ;;
       gzip-1) cmd=(sh -c 'gzip -1 -c "$0" >"$1"' "$input" "$out") ;;
       lz4-1) cmd=(sh -c 'lz4 -q -1 -c "$0" >"$1"' "$input" "$out") ;;
