@@ -57,7 +57,7 @@ payload all.LB 0 text
 payload packed.LB $(( ($(le32 packed.LB 4) + 63) / 64 * 64 )) words
 
 cp text.txt words.bin "$corpus/compress_input_fuzzer/"
-{ printf '\xc5'; cat words.bin; } > "$corpus/compress_input_fuzzer/stretched"
+{ printf '\xe5'; cat words.bin; } > "$corpus/compress_input_fuzzer/stretched"
 { printf '\x00\x02#;'; cat all.ls; } > "$corpus/split_text_fuzzer/all"
 { printf '\x08\x02;#'; cat stage1.ls; } > "$corpus/split_text_fuzzer/stage1"
 cp all.ls stage1.ls "$corpus/link_inputs_fuzzer/"
