@@ -82,7 +82,8 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
   unsigned char* out = out_start;
   unsigned char* out_flushed = out_start;  // bytes before it have gone to dstStrm
   int64_t out_total = 0;                   // bytes expanded before out_start
-  for (;;) {
+  bool ended = false;
+  while (!ended) {
     if (in_end - in < kMaxDirective && in_remain > 0) {
       const int kept = static_cast<int>(in_end - in);
       std::memmove(in_buf.p, in, kept);
@@ -98,62 +99,72 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
       out_total += out - out_start;
       out = out_flushed = out_start;
     }
-
-    if (in == in_end) invalid();
-    const int directive = *in++;
-    if (directive == 0xFF) break;
-    const int code = directive >> 5;
-    int leng = directive & 0x1F;
-    if (leng == 0) {
-      if (in_end - in < 2) invalid();
-      leng = in[0] | in[1] << 8;
-      in += 2;
-      if (leng == 0) invalid();
-    }
-    const int64_t produced = out_total + (out - out_start);
-    const int out_leng = code == 5 ? 2 * leng : leng;
-    if (out_leng > realSize - produced) invalid();
-    const int64_t avail = in_end - in;
-    switch (code) {
-      case 0:
-        if (avail < leng) invalid();
-        // The input buffer's slack makes the fixed-size read safe.
-        if (leng <= kShort) {
-          std::memcpy(out, in, kShort);
-        } else {
-          std::memcpy(out, in, leng);
-        }
-        in += leng;
-        break;
-      case 1:
-        fill(out, 0, leng);
-        break;
-      case 2:
-        if (avail < 1) invalid();
-        fill(out, *in++, leng);
-        break;
-      case 3:
-      case 4: {
-        if (avail < code - 2) invalid();
-        int offset = in[0];
-        if (code == 4) offset |= in[1] << 8;
-        in += code - 2;
-        if (offset == 0 || offset > kHistory || offset > produced) invalid();
-        sdCopy(out, offset, leng);
+    // Up to these limits neither a refill nor a flush is due.
+    const unsigned char* const in_stop = in_remain > 0 ? in_end - kMaxDirective : in_end;
+    unsigned char* const out_stop = out_start + kOutBlock;
+    do {
+      if (in == in_end) invalid();
+      const int directive = *in++;
+      if (directive == 0xFF) {
+        ended = true;
         break;
       }
-      case 5:
-        if (avail < leng) invalid();
-        for (int k = 0; k < leng; ++k) {
-          out[2 * k] = in[k];
-          out[2 * k + 1] = 0;
+      const int code = directive >> 5;
+      int leng = directive & 0x1F;
+      if (leng == 0) {
+        if (in_end - in < 2) invalid();
+        leng = in[0] | in[1] << 8;
+        in += 2;
+        if (leng == 0) invalid();
+      }
+      const int64_t produced = out_total + (out - out_start);
+      const int out_leng = code == 5 ? 2 * leng : leng;
+      if (out_leng > realSize - produced) invalid();
+      const int64_t avail = in_end - in;
+      if (code == 0 || code == 3 || code == 4) {
+        // Normal data and sd copies are both copies, from the payload or from the output;
+        // one path for both keeps the kind out of the branches of the common short case.
+        const bool is_sd = code != 0;
+        const int operand = is_sd ? code - 2 : leng;  // payload bytes after the length
+        if (avail < operand) invalid();
+        // The buffer's slack makes reading a second offset byte harmless.
+        const int offset = is_sd ? (in[0] | (code == 4 ? in[1] << 8 : 0)) : kHistory + 1;
+        if (is_sd && (offset == 0 || offset > kHistory || offset > produced)) invalid();
+        const unsigned char* src = is_sd ? out - offset : in;
+        in += operand;
+        if (leng <= kShort && offset >= 16) {
+          // Each 16-byte move reads only bytes already final, as none is longer than the
+          // offset; the slack of both buffers takes the overrun.
+          std::memcpy(out, src, 16);
+          std::memcpy(out + 16, src + 16, 16);
+        } else if (is_sd) {
+          sdCopy(out, offset, leng);
+        } else {
+          std::memcpy(out, src, leng);
         }
-        in += leng;
-        break;
-      default:
-        invalid();
-    }
-    out += out_leng;
+      } else {
+        switch (code) {
+          case 1:
+            fill(out, 0, leng);
+            break;
+          case 2:
+            if (avail < 1) invalid();
+            fill(out, *in++, leng);
+            break;
+          case 5:
+            if (avail < leng) invalid();
+            for (int k = 0; k < leng; ++k) {
+              out[2 * k] = in[k];
+              out[2 * k + 1] = 0;
+            }
+            in += leng;
+            break;
+          default:
+            invalid();
+        }
+      }
+      out += out_leng;
+    } while (in <= in_stop && out < out_stop);
   }
   if (in != in_end || in_remain != 0) invalid();
   if (out_total + (out - out_start) != realSize) invalid();
