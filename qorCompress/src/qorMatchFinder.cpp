@@ -157,7 +157,7 @@ void qorMatchFinder_t::addRun(const unsigned char* aLast, int aAbsEnd) {
   headRun_[h] = runCount_++;
 }
 
-int qorMatchFinder_t::matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom,
+inline int qorMatchFinder_t::matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom,
                                 int aCap) const {
   int k = aFrom;
   while (k + 8 <= aCap) {
@@ -167,18 +167,6 @@ int qorMatchFinder_t::matchLeng(const unsigned char* aA, const unsigned char* aB
   }
   while (k < aCap && aA[k] == aB[k]) ++k;
   return k;
-}
-
-int qorMatchFinder_t::find(int aCur, int aRunLeng, int aMinLeng, int& aOffset) {
-  const int cap = limit_ - aCur < kMaxMatch ? limit_ - aCur : kMaxMatch;
-  if (aMinLeng > cap) return 0;
-  insertUpTo(base_ + aCur);
-  if (aRunLeng >= 4) return findRun(aCur, aRunLeng, aMinLeng, cap, aOffset);
-  const int leng = cap >= 4 ? findChain(aCur, aMinLeng, cap, aOffset) : 0;
-  // Without a match of 4 or more, a match of 3 can only win when it is near: the nearest
-  // one within 255 is then the answer that counts.
-  if (leng == 0 && aMinLeng <= 3) return findNear3(aCur, aOffset);
-  return leng;
 }
 
 // The bytes at aCur are a run of aRunLeng bytes b followed by c. A match longer than the run
@@ -214,7 +202,7 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
   return best;
 }
 
-int qorMatchFinder_t::findChain(int aCur, int aMinLeng, int aCap, int& aOffset) {
+inline int qorMatchFinder_t::findChain(int aCur, int aMinLeng, int aCap, int& aOffset) {
   const unsigned char* cur = window_ + aCur;
   const int abs_cur = base_ + aCur;
   const int lowest = abs_cur - kMaxOffset;
@@ -237,7 +225,7 @@ int qorMatchFinder_t::findChain(int aCur, int aMinLeng, int aCap, int& aOffset) 
   return best;
 }
 
-int qorMatchFinder_t::findNear3(int aCur, int& aOffset) {
+inline int qorMatchFinder_t::findNear3(int aCur, int& aOffset) {
   const unsigned char* cur = window_ + aCur;
   const int abs_cur = base_ + aCur;
   const int lowest = abs_cur - kNearMax;
@@ -250,4 +238,16 @@ int qorMatchFinder_t::findNear3(int aCur, int& aOffset) {
     }
   }
   return 0;
+}
+
+int qorMatchFinder_t::find(int aCur, int aRunLeng, int aMinLeng, int& aOffset) {
+  const int cap = limit_ - aCur < kMaxMatch ? limit_ - aCur : kMaxMatch;
+  if (aMinLeng > cap) return 0;
+  insertUpTo(base_ + aCur);
+  if (aRunLeng >= 4) return findRun(aCur, aRunLeng, aMinLeng, cap, aOffset);
+  const int leng = cap >= 4 ? findChain(aCur, aMinLeng, cap, aOffset) : 0;
+  // Without a match of 4 or more, a match of 3 can only win when it is near: the nearest
+  // one within 255 is then the answer that counts.
+  if (leng == 0 && aMinLeng <= 3) return findNear3(aCur, aOffset);
+  return leng;
 }
