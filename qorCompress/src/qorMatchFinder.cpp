@@ -8,7 +8,6 @@ const int kMaxOffset = 1024;
 const int kMaxMatch = 2048;
 const int kNearMax = 255;
 const bool kLittleEndian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
-const int kRunRing = 512;  // runs of 4+ bytes ending in the last 1024 bytes number at most 206
 // Only the last 1024 positions (255 for the 3-byte table) are ever live, so the tables stay
 // small; the 4-byte one is sparse enough that chains rarely hold other bytes.
 const int kBits4 = 14;
@@ -52,11 +51,9 @@ qorMatchFinder_t::qorMatchFinder_t()
   std::memset(head4_, 0x80, sizeof(int) * heads4);
   std::memset(head3_, 0x80, sizeof(int) * heads3);
   std::memset(headRun_, 0xFF, sizeof(int) * run_heads);
-  runs_ = new Run_t[kRunRing];
 }
 
 qorMatchFinder_t::~qorMatchFinder_t() {
-  delete[] runs_;
   delete[] head4_;
 }
 

@@ -67,7 +67,9 @@ class qorMatchFinder_t {
   int* head3_;  // newest position per hash of 3 bytes not all equal
   int* prev3_;  // ring of 256
   int* headRun_;  // newest run index per hash of (run byte, byte after the run)
-  Run_t* runs_;   // ring of kRunRing runs of 4 or more equal bytes
+  // Runs of 4 or more bytes ending in the last 1024 bytes number at most 206.
+  static const int kRunRing = 512;
+  Run_t runs_[kRunRing];  // ring of the runs listed last
   int runCount_;
 };
 
