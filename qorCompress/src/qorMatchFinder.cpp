@@ -10,7 +10,7 @@ const int kNearMax = 255;
 const bool kLittleEndian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
 // Only the last 1024 positions (255 for the 3-byte table) are ever live, so the tables stay
 // small; the 4-byte one is sparse enough that chains rarely hold other bytes.
-const int kBits4 = 14;
+const int kBits4 = 13;
 const int kBits3 = 10;
 
 // Little-endian by construction; compilers make one load of it.
