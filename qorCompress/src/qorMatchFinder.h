@@ -9,7 +9,7 @@
 
 class qorMatchFinder_t {
  public:
-  // Allocates the tables (about 100 KB); the destructor releases them.
+  // Allocates the tables (about 45 KB); the destructor releases them.
   qorMatchFinder_t();
   ~qorMatchFinder_t();
   qorMatchFinder_t(const qorMatchFinder_t&) = delete;
