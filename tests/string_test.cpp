@@ -4,9 +4,12 @@
 #include <cstring>
 #include <initializer_list>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
+
+#include "tests/support/raisedtext.h"
 
 // Test-only view of a string's body.
 struct PortStringInspector_t {
@@ -25,26 +28,12 @@ using Inspect = PortStringInspector_t;
 
 std::string Text(const PortString_t& aStr) { return std::string(aStr.c_str(), aStr.GetLength()); }
 
-std::string Thrown(void (*aAction)()) {
-  try {
-    aAction();
-  } catch (const char* text) {
-    return text;
-  }
-  return "(nothing thrown)";
-}
-
 TEST(PortString, EmptyStringsShareOneBody) {
-  PortString_t a;
-  PortString_t b("abc", 0);
-  PortString_t c("abc", -1);
-  PortString_t d(nullptr, 3);
-  PortString_t e("");
-  EXPECT_EQ(0, a.GetLength());
+  const PortString_t a;
   EXPECT_STREQ("", a.c_str());
-  for (const PortString_t* s : {&b, &c, &d, &e}) {
-    EXPECT_EQ(Inspect::Body(a), Inspect::Body(*s));
-    EXPECT_STREQ("", s->c_str());
+  for (const PortString_t& s : {PortString_t("abc", 0), PortString_t("abc", -1),
+                                PortString_t(nullptr, 3), PortString_t("")}) {
+    EXPECT_EQ(Inspect::Body(a), Inspect::Body(s));
   }
 }
 
@@ -56,10 +45,8 @@ TEST(PortString, CopyOnWrite) {
 
   EXPECT_EQ(0, b.Replace('z', 'x'));
   EXPECT_EQ(Inspect::Body(a), Inspect::Body(b));
-  EXPECT_EQ(2, Inspect::RefCount(a));
 
   EXPECT_EQ(1, b.Replace('a', 'x'));
-  EXPECT_NE(Inspect::Body(a), Inspect::Body(b));
   EXPECT_EQ(1, Inspect::RefCount(a));
   EXPECT_EQ(1, Inspect::RefCount(b));
   EXPECT_EQ("abc", Text(a));
@@ -74,51 +61,43 @@ TEST(PortString, CopyOnWrite) {
 
   PortString_t d;
   d = a;
-  EXPECT_EQ(2, Inspect::RefCount(a));
   d = d;
   EXPECT_EQ(2, Inspect::RefCount(a));
   d = "";
   EXPECT_EQ(1, Inspect::RefCount(a));
-  EXPECT_EQ(0, d.GetLength());
 }
 
-TEST(PortString, AppendToItself) {
+// Runs read from the body that is being replaced.
+TEST(PortString, TextFromItsOwnBody) {
   PortString_t a("ab");
   a += a;
   EXPECT_EQ("abab", Text(a));
 
-  // The growth case: the run is read from the body being replaced.
-  const std::string thirty(30, 'k');
+  const std::string thirty(30, 'k');  // doubled, it outgrows the body
   PortString_t b(thirty.c_str());
   b += b;
   EXPECT_EQ(thirty + thirty, Text(b));
 
   PortString_t c(thirty.c_str());
-  PortString_t shared(c);
+  const PortString_t shared(c);
   c += c.c_str() + 25;
   EXPECT_EQ(thirty + "kkkkk", Text(c));
   EXPECT_EQ(thirty, Text(shared));
   EXPECT_EQ(1, Inspect::RefCount(shared));
-}
 
-TEST(PortString, AssignTextFromOwnBody) {
-  PortString_t a("hello");
-  a = a.c_str() + 1;
-  EXPECT_EQ("ello", Text(a));
+  PortString_t d("hello");
+  d = d.c_str() + 1;
+  EXPECT_EQ("ello", Text(d));
 }
 
 TEST(PortString, CapacityRule) {
-  const struct {
-    int length;
-    int capacity;
-  } cases[] = {{0, 16}, {1, 32}, {15, 32}, {16, 32}, {17, 48}, {31, 48}, {32, 48}, {33, 64}};
+  const std::pair<int, int> cases[] = {{0, 16}, {1, 32}, {16, 32}, {17, 48}, {32, 48}, {33, 64}};
   for (const auto& c : cases) {
     PortString_t s;
-    Inspect::Alloc(s, c.length);
-    EXPECT_EQ(c.capacity, Inspect::Capacity(s)) << c.length;
-    EXPECT_EQ(1, Inspect::RefCount(s));
-    if (c.length > 0) {
-      EXPECT_EQ(c.capacity, Inspect::Capacity(PortString_t('x', c.length))) << c.length;
+    Inspect::Alloc(s, c.first);
+    EXPECT_EQ(c.second, Inspect::Capacity(s)) << c.first;
+    if (c.first > 0) {
+      EXPECT_EQ(c.second, Inspect::Capacity(PortString_t('x', c.first))) << c.first;
     }
   }
 }
@@ -141,58 +120,42 @@ TEST(PortString, GrowthOneCharacterAtATime) {
   EXPECT_EQ((std::vector<int>{32, 64, 96, 128}), capacities);
 }
 
-TEST(PortString, ConstructAndAssign) {
+TEST(PortString, ConstructAssignAndRefusedSizes) {
   EXPECT_EQ("---", Text(PortString_t('-', 3)));
-  EXPECT_EQ(" illegal parameter.", Thrown([] { PortString_t('x', 0); }));
-  EXPECT_EQ(" illegal parameter.", Thrown([] { PortString_t('x', -5); }));
-  EXPECT_EQ(" memory not enough.", Thrown([] { PortString_t('x', INT_MAX); }));
-
-  PortString_t nul("a\0b", 3);
-  EXPECT_EQ(3, nul.GetLength());
-  EXPECT_EQ('b', nul[2]);
+  EXPECT_EQ(" illegal parameter.", RaisedText([] { PortString_t('x', 0); }));
+  EXPECT_EQ(" illegal parameter.", RaisedText([] { PortString_t('x', -5); }));
+  EXPECT_EQ(" memory not enough.", RaisedText([] { PortString_t('x', INT_MAX); }));
+  EXPECT_EQ(std::string("a\0b", 3), Text(PortString_t("a\0b", 3)));
 
   PortString_t q("abc");
   q = 'q';
-  EXPECT_EQ(1, q.GetLength());
   EXPECT_EQ(0, memcmp(q.c_str(), "q", 2));
-
   q += static_cast<const char*>(nullptr);
   q += "rs";
   q += 't';
   EXPECT_EQ("qrst", Text(q));
-}
 
-TEST(PortString, FailedGrowthLeavesStringIntact) {
-  PortString_t s("abc");
-  try {
-    Inspect::Append(s, "x", INT_MAX);
-    FAIL() << "no error raised";
-  } catch (const char* text) {
-    EXPECT_STREQ(" memory not enough.", text);
-  }
-  EXPECT_EQ("abc", Text(s));
+  // A failed growth leaves the string as it was.
+  EXPECT_EQ(" memory not enough.", RaisedText([&] { Inspect::Append(q, "x", INT_MAX); }));
+  EXPECT_EQ("qrst", Text(q));
 }
 
 TEST(PortString, Concatenation) {
   const PortString_t ab("ab");
   const PortString_t empty;
-  EXPECT_EQ(Inspect::Body(ab), Inspect::Body("" + ab));
-  EXPECT_EQ(Inspect::Body(ab), Inspect::Body(ab + ""));
-  EXPECT_EQ(Inspect::Body(ab), Inspect::Body(ab + empty));
-  EXPECT_EQ(Inspect::Body(ab), Inspect::Body(empty + ab));
+  // An empty side shares the other side's body.
+  for (const PortString_t& sum : {"" + ab, ab + "", ab + empty, empty + ab}) {
+    EXPECT_EQ(Inspect::Body(ab), Inspect::Body(sum));
+  }
   EXPECT_EQ(Inspect::Body(empty), Inspect::Body(empty + empty));
+  EXPECT_EQ(1, Inspect::RefCount(ab + PortString_t("cd")));
 
-  const PortString_t abcd = ab + PortString_t("cd");
-  EXPECT_EQ("abcd", Text(abcd));
-  EXPECT_EQ(1, Inspect::RefCount(abcd));
-  EXPECT_EQ("abcd", Text(ab + "cd"));
-  EXPECT_EQ("cdab", Text("cd" + ab));
-  EXPECT_EQ("cd", Text(empty + "cd"));
-  EXPECT_EQ("cd", Text("cd" + empty));
-  EXPECT_EQ("abc", Text(ab + 'c'));
-  EXPECT_EQ("cab", Text('c' + ab));
-  EXPECT_EQ("c", Text(empty + 'c'));
-  EXPECT_EQ("c", Text('c' + empty));
+  const std::pair<PortString_t, const char*> sums[] = {
+      {ab + PortString_t("cd"), "abcd"}, {ab + "cd", "abcd"}, {"cd" + ab, "cdab"},
+      {empty + "cd", "cd"}, {"cd" + empty, "cd"}, {ab + 'c', "abc"},
+      {'c' + ab, "cab"}, {empty + 'c', "c"}, {'c' + empty, "c"},
+  };
+  for (const auto& s : sums) EXPECT_EQ(s.second, Text(s.first));
 }
 
 TEST(PortString, Comparison) {
@@ -207,8 +170,7 @@ TEST(PortString, Comparison) {
   EXPECT_GT(Compare(PortString_t("\x80"), PortString_t("a")), 0);  // bytes are unsigned
 
   const PortString_t nul1("ab\0x", 4);
-  const PortString_t nul2("ab\0y", 4);
-  EXPECT_TRUE(nul1 == nul2);
+  EXPECT_TRUE(nul1 == PortString_t("ab\0y", 4));
   EXPECT_TRUE(nul1 == "ab");
   EXPECT_TRUE(upper != lower);
   EXPECT_TRUE(upper != "nocomp");
@@ -217,28 +179,24 @@ TEST(PortString, Comparison) {
 
 TEST(PortString, FindAndReverseFind) {
   const PortString_t hello("hello");
-  const struct {
-    int result;
-    int expected;
-  } cases[] = {
+  const std::pair<int, int> cases[] = {
       {hello.Find('l'), 2},           {hello.Find('z'), -1},
       {hello.Find('o', 4), -1},       {hello.Find('o', 5), 4},
       {hello.Find('h', 0), -1},       {hello.Find('o', 99), 4},
       {hello.ReverseFind('l'), 3},    {hello.ReverseFind('z'), -1},
-      {hello.ReverseFind('l', 2), 3}, {hello.ReverseFind('l', 4), 3},
-      {hello.ReverseFind('h', 1), 0}, {hello.ReverseFind('x', 9), 4},
-      {hello.ReverseFind('h', -3), 0}, {PortString_t().ReverseFind('a', 0), -1},
+      {hello.ReverseFind('l', 4), 3}, {hello.ReverseFind('h', 1), 0},
+      {hello.ReverseFind('x', 9), 4}, {hello.ReverseFind('h', -3), 0},
+      {PortString_t().ReverseFind('a', 0), -1},
   };
   for (size_t i = 0; i < sizeof cases / sizeof cases[0]; ++i) {
-    EXPECT_EQ(cases[i].expected, cases[i].result) << "case " << i;
+    EXPECT_EQ(cases[i].second, cases[i].first) << "case " << i;
   }
 }
 
-TEST(PortString, Substr) {
+TEST(PortString, SubstrAndLabelString) {
   const PortString_t hello("hello");
   const struct {
-    int from;
-    int length;
+    int from, length;
     const char* expected;
   } cases[] = {
       {1, 3, "ell"}, {-2, 4, "he"}, {3, 10, "lo"}, {5, 1, ""},       {6, 1, ""},
@@ -247,20 +205,12 @@ TEST(PortString, Substr) {
   for (const auto& c : cases) {
     EXPECT_EQ(c.expected, Text(hello.Substr(c.from, c.length))) << c.from << "," << c.length;
   }
-  const PortString_t whole = hello.Substr(0, 5);
-  EXPECT_NE(Inspect::Body(hello), Inspect::Body(whole));
-}
+  EXPECT_NE(Inspect::Body(hello), Inspect::Body(hello.Substr(0, 5)));
 
-TEST(PortString, LabelString) {
-  const struct {
-    const char* in;
-    const char* out;
-  } cases[] = {
+  const std::pair<const char*, const char*> labels[] = {
       {"3d-model.x", "_3d_model_x"}, {"a b", "a_b"}, {"", ""}, {"7", "_7"}, {"Ab9\xe9", "Ab9_"},
   };
-  for (const auto& c : cases) {
-    EXPECT_EQ(c.out, Text(PortString_t(c.in).LabelString())) << c.in;
-  }
+  for (const auto& l : labels) EXPECT_EQ(l.second, Text(PortString_t(l.first).LabelString()));
 }
 
 template <typename T>
@@ -282,15 +232,15 @@ void CheckConversions(T (PortString_t::*aConvert)(bool*) const,
 
 TEST(PortString, NumberConversion) {
   CheckConversions<int>(&PortString_t::ToInt,
-                        {{"0x1A", 26, false}, {"0X1a", 26, false}, {"010", 8, false},
-                         {" 12", 12, false}, {"", 0, false}, {"-2147483648", INT_MIN, false},
+                        {{"0x1A", 26, false}, {"010", 8, false}, {" 12", 12, false},
+                         {"", 0, false}, {"-2147483648", INT_MIN, false},
                          {"2147483647", INT_MAX, false}, {"12 ", 0, true}, {"08", 0, true},
                          {"1.5", 0, true}, {"2147483648", 0, true}, {"-2147483649", 0, true},
                          {"0xFFFFFFFF", 0, true}, {"abc", 0, true}});
   CheckConversions<unsigned int>(
       &PortString_t::ToUint,
       {{"4294967295", 4294967295u, false}, {"-1", 4294967295u, false},
-       {"-4294967295", 1u, false}, {"0xffffffff", 4294967295u, false}, {"-0", 0u, false},
+       {"-4294967295", 1u, false}, {"0xffffffff", 4294967295u, false},
        {"4294967296", 0u, true}, {"-4294967296", 0u, true}, {"18446744073709551615", 0u, true},
        {"-18446744073709551615", 0u, true}, {"99999999999999999999", 0u, true}});
   CheckConversions<double>(&PortString_t::ToFloat,
@@ -303,10 +253,10 @@ TEST(PortString, NumberConversion) {
   EXPECT_TRUE(error);
 
   EXPECT_EQ(-7, PortString_t("-7").ToInt(nullptr));
-  EXPECT_EQ("ERROR : PortString_t::ToInt", Thrown([] { PortString_t("x").ToInt(nullptr); }));
-  EXPECT_EQ("ERROR : PortString_t::ToInt", Thrown([] { PortString_t("-").ToUint(nullptr); }));
+  EXPECT_EQ("ERROR : PortString_t::ToInt", RaisedText([] { PortString_t("x").ToInt(nullptr); }));
+  EXPECT_EQ("ERROR : PortString_t::ToInt", RaisedText([] { PortString_t("-").ToUint(nullptr); }));
   EXPECT_EQ("ERROR : PortString_t::ToFloat",
-            Thrown([] { PortString_t("1e400").ToFloat(nullptr); }));
+            RaisedText([] { PortString_t("1e400").ToFloat(nullptr); }));
 }
 
 TEST(PortString, Format) {
@@ -314,14 +264,10 @@ TEST(PortString, Format) {
   EXPECT_EQ(0, PortString_t::Format("%s", "").GetLength());
   for (int length : {1023, 1024, 1025, 5000}) {
     const std::string body(length - 1, 'z');
-    const PortString_t s = PortString_t::Format("%s!", body.c_str());
-    EXPECT_EQ(body + "!", Text(s)) << length;
+    EXPECT_EQ(body + "!", Text(PortString_t::Format("%s!", body.c_str()))) << length;
   }
-}
-
-TEST(PortString, FormatEncodingErrorRaisesIllegalParameter) {
   // A wide character the "C" locale cannot encode makes the formatter fail whatever the size.
-  EXPECT_EQ(" illegal parameter.", Thrown([] { PortString_t::Format("%ls", L"\x20AC"); }));
+  EXPECT_EQ(" illegal parameter.", RaisedText([] { PortString_t::Format("%ls", L"\x20AC"); }));
 }
 
 }  // namespace
