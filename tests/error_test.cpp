@@ -4,16 +4,9 @@
 
 #include <gtest/gtest.h>
 
-namespace {
+#include "tests/support/raisedtext.h"
 
-std::string ThrownBy(int aErrorNum) {
-  try {
-    PortErrorThrow(aErrorNum);
-  } catch (const char* text) {
-    return text;
-  }
-  return "(nothing thrown)";
-}
+namespace {
 
 TEST(PortError, MessageTable) {
   const char* const expected[] = {
@@ -26,41 +19,23 @@ TEST(PortError, MessageTable) {
   };
   for (int code = 0; code < 16; ++code) {
     EXPECT_STREQ(expected[code], PortErrorGetMsg(code).c_str()) << code;
-    EXPECT_EQ(expected[code], ThrownBy(code)) << code;
+    EXPECT_EQ(expected[code], RaisedText([&] { PortErrorThrow(code); })) << code;
   }
   for (int code : {16, -1, 1000, -2147483647 - 1}) {
     EXPECT_STREQ(" unknown error.", PortErrorGetMsg(code).c_str()) << code;
-    EXPECT_EQ(" unknown error.", ThrownBy(code)) << code;
+    EXPECT_EQ(" unknown error.", RaisedText([&] { PortErrorThrow(code); })) << code;
   }
 }
 
-TEST(PortError, GetStrEmptiesLastErrorString) {
-  try {
-    PortErrorThrow(4);
-  } catch (const char* text) {
-    EXPECT_STREQ(" memory not enough.", text);
-    EXPECT_EQ(0, PortErrorGetStr().GetLength());
-  }
-}
-
-TEST(PortError, SecondRaiseReplacesFirst) {
-  EXPECT_EQ(" could't open.", ThrownBy(7));
-  EXPECT_EQ(" read error.", ThrownBy(9));
-  try {
-    PortErrorThrow(PortErrorGetStr());
-  } catch (const char* text) {
-    EXPECT_STREQ("", text);
-  }
-}
-
-TEST(PortError, ComposedMessage) {
-  try {
-    PortString_t& message = PortErrorGetStr();
-    message = "list.ls" + PortErrorGetMsg(7);
-    PortErrorThrow(message);
-  } catch (const char* text) {
-    EXPECT_STREQ("list.ls could't open.", text);
-  }
+// The thrown text is the last-error string, which GetStr empties for composing a message.
+TEST(PortError, LastErrorStringCarriesTheComposedMessage) {
+  EXPECT_EQ(" could't open.", RaisedText([] { PortErrorThrow(7); }));
+  EXPECT_EQ("", RaisedText([] { PortErrorThrow(PortErrorGetStr()); }));
+  EXPECT_EQ("list.ls could't open.", RaisedText([] {
+              PortString_t& message = PortErrorGetStr();
+              message = "list.ls" + PortErrorGetMsg(7);
+              PortErrorThrow(message);
+            }));
 }
 
 }  // namespace
