@@ -5,8 +5,12 @@
 #define TESTS_SUPPORT_LINKFIXTURE_H
 
 #include <cstdint>
+#include <map>
 #include <string>
 #include <vector>
+
+#include "gtest/gtest.h"
+#include "port/src/string.h"
 
 // A fresh directory from mkdtemp, removed with everything in it on destruction.
 class LinkTempDir_t {
@@ -38,6 +42,36 @@ struct ToolRun_t {
 // Runs `aProgram` with `aArgs` in the directory `aCwd`, standard input empty.
 ToolRun_t RunTool(const std::string& aProgram, const std::vector<std::string>& aArgs,
                   const std::string& aCwd);
+
+// Relative name -> contents.
+typedef std::map<std::string, std::string> FileSet_t;
+
+#ifdef QOR_LINK_BIN  // only test executables know where qorLink was built
+// Puts `aFiles` and the response file a.ls into `aDir`, runs the built qorLink on it and
+// returns the bytes of a.LB.
+inline std::string LinkFiles(const LinkTempDir_t& aDir, const FileSet_t& aFiles,
+                             const std::string& aList) {
+  for (const auto& file : aFiles) aDir.Put(file.first, file.second);
+  aDir.Put("a.ls", aList);
+  ToolRun_t run = RunTool(QOR_LINK_BIN, {"a.ls"}, aDir.Path());
+  EXPECT_EQ(run.status, 0) << run.err;
+  return ReadBytes(aDir / "a.LB");
+}
+#endif
+
+// Runs a callable and returns the text it raised (const char* or PortString_t), or
+// "<nothing raised>".
+template <typename Callable>
+std::string FailureText(Callable aCall) {
+  try {
+    aCall();
+  } catch (const PortString_t& text) {
+    return text.c_str();
+  } catch (const char* text) {
+    return text;
+  }
+  return "<nothing raised>";
+}
 
 // Archive bytes, little-endian, built field by field.
 std::string EntryHeader(uint8_t aType, uint8_t aCompression, uint16_t aUserId,
