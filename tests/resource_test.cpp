@@ -6,6 +6,8 @@
 
 #include "port/src/resource.h"
 
+typedef std::vector<const PortResource_t*> Resources;
+
 // Test-only view of the anchor stack and of each anchor's list of resources.
 struct PortResourceInspector_t {
   static PortResourceAnchor_t* Current() { return PortResourceAnchor_t::current; }
@@ -16,12 +18,12 @@ struct PortResourceInspector_t {
   static void Destroy(PortResourceAnchor_t* aAnchor) { delete aAnchor; }
 
   // The list from head to tail; also checks that the backward links mirror it.
-  static std::vector<const PortResource_t*> List(const PortResourceAnchor_t* aAnchor) {
-    std::vector<const PortResource_t*> forward;
+  static Resources List(const PortResourceAnchor_t* aAnchor) {
+    Resources forward;
     for (const PortResource_t* r = aAnchor->head; r != nullptr; r = r->next) forward.push_back(r);
-    std::vector<const PortResource_t*> backward;
+    Resources backward;
     for (const PortResource_t* r = aAnchor->tail; r != nullptr; r = r->prev) backward.push_back(r);
-    EXPECT_EQ(std::vector<const PortResource_t*>(backward.rbegin(), backward.rend()), forward);
+    EXPECT_EQ(Resources(backward.rbegin(), backward.rend()), forward);
     EXPECT_EQ(aAnchor->count, static_cast<int>(forward.size()));
     return forward;
   }
@@ -57,7 +59,9 @@ class Resource : public ::testing::Test {
   }
 };
 
-TEST_F(Resource, FirstResourceCreatesTheRootAnchor) {
+TEST_F(Resource, RootAnchorIsMadeOnDemandAndReleasesNewestFirst) {
+  PortResourceAnchor_t::Release(false);  // no anchor: nothing to do
+  EXPECT_EQ(Inspect::Current(), nullptr);
   std::string log;
   Tracked_t* p = new Tracked_t("P", &log);
   PortResourceAnchor_t* root = Inspect::Current();
@@ -65,42 +69,10 @@ TEST_F(Resource, FirstResourceCreatesTheRootAnchor) {
   EXPECT_EQ(PortResourceAnchor_t::GetCurrent(), root);
   EXPECT_EQ(Inspect::Prev(root), nullptr);
   EXPECT_EQ(Inspect::AnchorOf(*p), root);
-  EXPECT_EQ(root->GetCount(), 1);
   delete p;
   EXPECT_EQ(root->GetCount(), 0);
   EXPECT_EQ(Inspect::Current(), root);  // an anchor outlives its resources
-  EXPECT_EQ(log, "P");
-}
-
-TEST_F(Resource, DestroyingOneResourceUnlinksItInPlace) {
-  struct Case {
-    int removed;
-    std::vector<int> left;
-  };
-  const Case cases[] = {{0, {1, 2}}, {1, {0, 2}}, {2, {0, 1}}};
-  for (const Case& c : cases) {
-    SCOPED_TRACE(c.removed);
-    PortResourceAnchor_t* anchor = PortResourceAnchor_t::NewAnchor();
-    std::string log;
-    Tracked_t* res[3] = {new Tracked_t("P", &log), new Tracked_t("Q", &log),
-                         new Tracked_t("S", &log)};
-    EXPECT_EQ(Inspect::List(anchor),
-              (std::vector<const PortResource_t*>{res[0], res[1], res[2]}));
-    delete res[c.removed];
-    std::vector<const PortResource_t*> expected;
-    for (int i : c.left) expected.push_back(res[i]);
-    EXPECT_EQ(Inspect::List(anchor), expected);
-    // Removing the new head then leaves one resource as head and tail.
-    delete res[c.left[0]];
-    EXPECT_EQ(Inspect::List(anchor), (std::vector<const PortResource_t*>{res[c.left[1]]}));
-    delete res[c.left[1]];
-    EXPECT_TRUE(Inspect::List(anchor).empty());
-    PortResourceAnchor_t::Release(false);
-  }
-}
-
-TEST_F(Resource, ReleaseDeletesNewestFirst) {
-  std::string log;
+  log.clear();
   new Tracked_t("P", &log);
   new Tracked_t("Q", &log);
   new Tracked_t("S", &log);
@@ -109,36 +81,49 @@ TEST_F(Resource, ReleaseDeletesNewestFirst) {
   EXPECT_EQ(Inspect::Current(), nullptr);  // the root is gone too
 }
 
-TEST_F(Resource, ReleaseWithoutAnchorDoesNothing) {
-  PortResourceAnchor_t::Release(false);
-  EXPECT_EQ(Inspect::Current(), nullptr);
+TEST_F(Resource, DestroyingOneResourceUnlinksItInPlace) {
+  for (int removed = 0; removed < 3; ++removed) {
+    SCOPED_TRACE(removed);
+    PortResourceAnchor_t* anchor = PortResourceAnchor_t::NewAnchor();
+    std::string log;
+    Tracked_t* res[3] = {new Tracked_t("P", &log), new Tracked_t("Q", &log),
+                         new Tracked_t("S", &log)};
+    EXPECT_EQ(Inspect::List(anchor), (Resources{res[0], res[1], res[2]}));
+    Resources left;
+    for (int i = 0; i < 3; ++i) {
+      if (i != removed) left.push_back(res[i]);
+    }
+    delete res[removed];
+    EXPECT_EQ(Inspect::List(anchor), left);
+    // Removing the new head then leaves one resource as head and tail.
+    delete left[0];
+    EXPECT_EQ(Inspect::List(anchor), (Resources{left[1]}));
+    delete left[1];
+    EXPECT_TRUE(Inspect::List(anchor).empty());
+    PortResourceAnchor_t::Release(false);
+  }
 }
 
-TEST_F(Resource, NestedAnchorOwnsOnlyLaterResources) {
+// A nested anchor owns only the resources made after it; ending an outer anchor ends
+// the inner ones first.
+TEST_F(Resource, NestedAnchors) {
   std::string log;
-  Tracked_t* x = new Tracked_t("X", &log);
+  Tracked_t* a = new Tracked_t("a", &log);
+  Tracked_t* b = new Tracked_t("b", &log);
   PortResourceAnchor_t* root = Inspect::Current();
   PortResourceAnchor_t* inner = PortResourceAnchor_t::NewAnchor();
   EXPECT_EQ(Inspect::Current(), inner);
   EXPECT_EQ(Inspect::Prev(inner), root);
   EXPECT_EQ(Inspect::Next(root), inner);
-  Tracked_t* y = new Tracked_t("Y", &log);
-  EXPECT_EQ(Inspect::AnchorOf(*y), inner);
-  EXPECT_EQ(root->GetCount(), 1);
-
+  Tracked_t* x = new Tracked_t("x", &log);
+  EXPECT_EQ(Inspect::AnchorOf(*x), inner);
   PortResourceAnchor_t::Release(false);
-  EXPECT_EQ(log, "Y");
+  EXPECT_EQ(log, "x");
   EXPECT_EQ(Inspect::Current(), root);
   EXPECT_EQ(Inspect::Next(root), nullptr);
-  EXPECT_EQ(Inspect::List(root), (std::vector<const PortResource_t*>{x}));
-  delete x;  // before its log goes out of scope
-}
+  EXPECT_EQ(Inspect::List(root), (Resources{a, b}));
 
-TEST_F(Resource, EndingAnAnchorEndsItsInnerAnchorsFirst) {
-  std::string log;
-  new Tracked_t("a", &log);
-  new Tracked_t("b", &log);
-  PortResourceAnchor_t* root = Inspect::Current();
+  log.clear();
   PortResourceAnchor_t::NewAnchor();
   new Tracked_t("c", &log);
   new Tracked_t("d", &log);
