@@ -1,9 +1,7 @@
 // The built qorLink run in a private directory: exact standard output, standard error and
 // exit status, and which files exist afterwards.
-#include <sys/stat.h>
 #include <unistd.h>
 
-#include <map>
 #include <string>
 #include <vector>
 
@@ -16,13 +14,11 @@ const std::string kUsage =
     "\n  usage: qorLink [options] respfile.ext<cr>\n\n  options:\n"
     "    -o or --output, <file> : set output filename <file>.\n\n";
 
-typedef std::map<std::string, std::string> Files_t;
-
 ToolRun_t Link(const LinkTempDir_t& dir, const std::vector<std::string>& args) {
   return RunTool(QOR_LINK_BIN, args, dir.Path());
 }
 
-void PutAll(const LinkTempDir_t& dir, const Files_t& files) {
+void PutAll(const LinkTempDir_t& dir, const FileSet_t& files) {
   for (const auto& file : files) dir.Put(file.first, file.second);
 }
 
@@ -87,131 +83,65 @@ TEST(QorLinkCli, OutputNameDerivation) {
   }
 }
 
-// Every failure prints one line and exits 1; an archive already created is removed.
+// Every failure prints one line and exits 1. Each run finds an older list.LB: an archive
+// the run created is removed, one it never opened keeps its bytes, and no input changes.
 TEST(QorLinkCli, FailureTextsAndArchiveRemoval) {
   const std::string own_header_short = EntryHeader(0x22, 0x00, 0, 16 + 8, "MDL\0", 0) + "1234";
   const std::string own_header_bad = EntryHeader(0x22, 0x10, 0, 16 + 15, "MDL\0", 0) + Zeros(40);
   const std::string name48(48, 'n');
-  struct Case {
-    Files_t files;
+  const std::string long_name_list = "%setfilename\nd/" + name48 + "\n";
+  const struct {
+    const char* list;  // list.ls, or nullptr for none
+    std::string err;   // after "Exception : "
+    FileSet_t files;
     std::vector<std::string> args;
-    std::string err;
-    std::string output;
+    bool removed;  // list.LB was created and is gone
   } cases[] = {
-      {{}, {"list"}, "Exception : list.ls could't open.\n", "list.LB"},
-      {{{"lists/a.ls", "a.dat\n; note\n%foo\n"}, {"a.dat", "hello"}},
-       {"lists/a"},
-       "Exception : lists/a:3: unknow directive %foo.\n",
-       "a.LB"},
-      {{{"list.ls", "% nocompress\n"}}, {"list"}, "Exception : list:1: unknow directive %.\n",
-       "list.LB"},
-      {{{"list.ls", "a.dat\nmissing.dat id=zz\n"}, {"a.dat", "hello"}},
-       {"list"},
-       "Exception : missing.dat could't open.\n",
-       "list.LB"},
-      {{{"list.ls", "sub\\missing.dat\n"}}, {"list"},
-       "Exception : sub/missing.dat could't open.\n", "list.LB"},
-      {{{"list.ls", "%setfilename\nsub\\\n"}, {"sub/keep", ""}},
-       {"list"},
-       "Exception : sub/ could't open.\n",
-       "list.LB"},
-      {{{"list.ls", "a.dat id=12a\n"}, {"a.dat", "hello"}},
-       {"list"},
-       "Exception : Error : option id=12a\n\n",
-       "list.LB"},
-      {{{"list.ls", "a.dat comp COMP\n"}, {"a.dat", "hello"}},
-       {"list"},
-       "Exception : Error : duplicate compress-options.\n",
-       "list.LB"},
-      {{{"list.ls", "a.dat setfilename nosetfilename\n"}, {"a.dat", "hello"}},
-       {"list"},
-       "Exception : Error : duplicate setfilename-options.\n",
-       "list.LB"},
-      {{{"list.ls", "%setfilename\nd/" + name48 + "\n"}, {"d/" + name48, "x"}},
-       {"list"},
-       "Exception : " + name48 + "it too long.\n\n",
-       "list.LB"},
-      {{{"list.ls", "x.MB\n"}, {"x.MB", "0123456789"}},
-       {"list"},
-       "Exception : x.MB read error.\n",
-       "list.LB"},
-      {{{"list.ls", "x.MB nocomp\n"}, {"x.MB", own_header_short}},
-       {"list"},
-       "Exception : x.MB read error.\n",
-       "list.LB"},
-      {{{"list.ls", "x.AB\n"}, {"x.AB", own_header_bad}},
-       {"list"},
-       "Exception : x.AB invalid file format.\n",
-       "list.LB"},
-      {{{"list.ls", "x.PB\n"}, {"x.PB", EntryHeader(1, 0, 0, 15, "DAT\0", 0) + Zeros(64)}},
-       {"list"},
-       "Exception : x.PB invalid file format.\n",
-       "list.LB"},
-      {{{"list.ls", "x.PB\n"}, {"x.PB", EntryHeader(1, 0, 0, 21, "DAT\0", 0) + "hello"}},
-       {"list"},
-       "Exception : x.PB read error.\n",
-       "list.LB"},
-      {{{"list.ls", "a.dat\n"}, {"a.dat", "hello"}},
-       {"list", "-o", "list.ls"},
-       "Exception : list.ls could't create.\n",
-       ""},
-      {{{"list.ls", "a.dat\n"}, {"a.dat", "hello"}},
-       {"list", "-o", "nodir\\x"},
-       "Exception : nodir/x.LB could't create.\n",
-       "nodir"},
-      {{{"list.ls", "a.dat\nlist.LB\n"}, {"a.dat", "hello"}},
-       {"list"},
-       "Exception : list.LB could't open.\n",
-       "list.LB"},
+      {nullptr, "list.ls could't open.\n", {}, {"list"}, false},
+      {"", "lists/a:3: unknow directive %foo.\n", {{"lists/a.ls", "a.dat\n; note\n%foo\n"}},
+       {"lists/a"}, false},
+      {"% nocompress\n", "list:1: unknow directive %.\n", {}, {"list"}, true},
+      {"a.dat\nmissing.dat id=zz\n", "missing.dat could't open.\n", {}, {"list"}, true},
+      {"sub\\missing.dat\n", "sub/missing.dat could't open.\n", {}, {"list"}, true},
+      {"%setfilename\nsub\\\n", "sub/ could't open.\n", {{"sub/keep", ""}}, {"list"}, true},
+      {"a.dat id=12a\n", "Error : option id=12a\n\n", {}, {"list"}, true},
+      {"a.dat comp COMP\n", "Error : duplicate compress-options.\n", {}, {"list"}, true},
+      {"a.dat setfilename nosetfilename\n", "Error : duplicate setfilename-options.\n", {},
+       {"list"}, true},
+      {long_name_list.c_str(), name48 + "it too long.\n\n", {{"d/" + name48, "x"}}, {"list"}, true},
+      {"x.MB\n", "x.MB read error.\n", {{"x.MB", "0123456789"}}, {"list"}, true},
+      {"x.MB nocomp\n", "x.MB read error.\n", {{"x.MB", own_header_short}}, {"list"}, true},
+      {"x.AB\n", "x.AB invalid file format.\n", {{"x.AB", own_header_bad}}, {"list"}, true},
+      {"x.PB\n", "x.PB invalid file format.\n",
+       {{"x.PB", EntryHeader(1, 0, 0, 15, "DAT\0", 0) + Zeros(64)}}, {"list"}, true},
+      {"x.PB\n", "x.PB read error.\n", {{"x.PB", EntryHeader(1, 0, 0, 21, "DAT\0", 0) + "hello"}},
+       {"list"}, true},
+      // The archive is the response file, or a listed file reaches it through a link.
+      {"a.dat\n", "list.ls could't create.\n", {}, {"list", "-o", "list.ls"}, false},
+      {"a.dat\nalias.dat\n", "alias.dat could't open.\n", {}, {"list"}, true},
+      {"a.dat\n", "nodir/x.LB could't create.\n", {}, {"list", "-o", "nodir\\x"}, false},
   };
-  for (const Case& c : cases) {
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.err);
     LinkTempDir_t dir;
-    PutAll(dir, c.files);
+    FileSet_t files = c.files;
+    files["a.dat"] = "hello";
+    if (c.list != nullptr) files["list.ls"] = c.list;
+    PutAll(dir, files);
+    dir.Put("list.LB", "older archive");
+    ASSERT_EQ(symlink("list.LB", (dir / "alias.dat").c_str()), 0);
     ToolRun_t run = Link(dir, c.args);
-    EXPECT_EQ(run.status, 1) << c.err;
+    EXPECT_EQ(run.status, 1);
     EXPECT_EQ(run.out, "");
-    EXPECT_EQ(run.err, c.err);
-    if (!c.output.empty()) {
-      EXPECT_FALSE(FileExists(dir / c.output)) << c.err;
+    EXPECT_EQ(run.err, "Exception : " + c.err);
+    if (c.removed) {
+      EXPECT_FALSE(FileExists(dir / "list.LB"));
+    } else {
+      EXPECT_EQ(ReadBytes(dir / "list.LB"), "older archive");
     }
-    for (const auto& file : c.files) EXPECT_EQ(ReadBytes(dir / file.first), file.second);
+    EXPECT_FALSE(FileExists(dir / "nodir"));
+    for (const auto& file : files) EXPECT_EQ(ReadBytes(dir / file.first), file.second);
   }
-}
-
-TEST(QorLinkCli, MissingResponseFileLeavesExistingOutputAlone) {
-  LinkTempDir_t dir;
-  dir.Put("list.LB", "older archive");
-  ToolRun_t run = Link(dir, {"list"});
-  EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "Exception : list.ls could't open.\n");
-  EXPECT_EQ(ReadBytes(dir / "list.LB"), "older archive");
-}
-
-TEST(QorLinkCli, ArchiveReachedThroughAnotherNameIsNotListed) {
-  LinkTempDir_t dir;
-  dir.Put("list.ls", "alias.dat\n");
-  dir.Put("list.LB", "older archive");
-  ASSERT_EQ(link((dir / "list.LB").c_str(), (dir / "alias.dat").c_str()), 0);
-  ToolRun_t run = Link(dir, {"list"});
-  EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "Exception : alias.dat could't open.\n");
-  EXPECT_FALSE(FileExists(dir / "list.LB"));
-}
-
-// A name without extension gets ".LB", so a device is reached here through a link.
-TEST(QorLinkCli, FailedRunKeepsOutputThatIsNoRegularFile) {
-  LinkTempDir_t dir;
-  dir.Put("list.ls", "a.dat nocomp\n");
-  dir.Put("a.dat", "hello");
-  ASSERT_EQ(symlink("/dev/full", (dir / "full.LB").c_str()), 0);
-  ToolRun_t run = Link(dir, {"list", "-o", "full.LB"});
-  EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "Exception : full.LB write error.\n");
-  struct stat info;
-  ASSERT_EQ(lstat("/dev/full", &info), 0);
-  EXPECT_TRUE(S_ISCHR(info.st_mode));
-  ASSERT_EQ(lstat((dir / "full.LB").c_str(), &info), 0);
-  EXPECT_TRUE(S_ISLNK(info.st_mode));
 }
 
 // The run of the overview: a comment, directives, an id, a file with its own header
