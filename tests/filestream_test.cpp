@@ -38,22 +38,24 @@ class FileStream : public ::testing::Test {
   std::string dir;
 };
 
+// Written through a backslashed name, read back through the slash form.
 TEST_F(FileStream, WrittenBytesReadBack) {
+  ASSERT_EQ(mkdir(Path("a").c_str(), 0700), 0);
   PortFileStream_t stream;
-  stream.WriteOpen(Path("a.bin").c_str());
+  stream.WriteOpen((dir + "\\a\\b.dat").c_str());
   EXPECT_TRUE(stream.CanWrite());
   EXPECT_FALSE(stream.CanRead());
   stream.WriteBuffer("hello, world", 12);
   EXPECT_EQ(stream.GetPosition(), 12);
   // Reopening for reading closes (and so flushes) the written file first.
-  stream.ReadOpen(Path("a.bin").c_str());
+  stream.ReadOpen(Path("a/b.dat").c_str());
   EXPECT_FALSE(stream.CanWrite());
   EXPECT_TRUE(stream.CanRead());
   char buffer[16];
   stream.ReadBuffer(buffer, 12);
   EXPECT_EQ(std::string(buffer, 12), "hello, world");
   EXPECT_EQ(stream.Read(buffer, 1), 0);  // end of file: a short count, no error
-  EXPECT_EQ(RaisedText([&] { stream.ReadBuffer(buffer, 1); }), Path("a.bin") + " read error.");
+  EXPECT_EQ(RaisedText([&] { stream.ReadBuffer(buffer, 1); }), Path("a/b.dat") + " read error.");
 }
 
 TEST_F(FileStream, WriteOpenTruncatesAndDestructionCloses) {
@@ -76,71 +78,40 @@ TEST_F(FileStream, WriteOpenTruncatesAndDestructionCloses) {
 TEST_F(FileStream, FailuresNameTheFile) {
   Put("f.bin", "0123456789");
   ASSERT_EQ(mkdir(Path("sub").c_str(), 0700), 0);
-  const std::string file = Path("f.bin");
+  PortFileStream_t opener;
+  EXPECT_EQ(RaisedText([&] { opener.WriteOpen(Path("no/x.bin").c_str()); }),
+            Path("no/x.bin") + " could't create.");
+  EXPECT_EQ(RaisedText([&] { opener.ReadOpen(Path("none").c_str()); }),
+            Path("none") + " could't open.");
+  EXPECT_EQ(RaisedText([&] { opener.ReadOpen(Path("sub").c_str()); }),
+            Path("sub") + " could't open.");
+
+  // The stream is never opened, open for reading f.bin or open for writing w.bin.
+  enum Opened { kNever, kReading, kWriting };
   struct Case {
-    const char* what;
-    void (*action)(PortFileStream_t&, const std::string&);
-    std::string text;
+    Opened opened;
+    void (*action)(PortFileStream_t&);
+    const char* text;  // after the file's name
   };
+  static char byte;
   const Case cases[] = {
-      {"create in a missing directory",
-       [](PortFileStream_t& s, const std::string& d) { s.WriteOpen((d + "/no/x.bin").c_str()); },
-       dir + "/no/x.bin could't create."},
-      {"open a missing file",
-       [](PortFileStream_t& s, const std::string& d) { s.ReadOpen((d + "/none").c_str()); },
-       dir + "/none could't open."},
-      {"open a directory",
-       [](PortFileStream_t& s, const std::string& d) { s.ReadOpen((d + "/sub").c_str()); },
-       dir + "/sub could't open."},
-      {"write a never-opened stream",
-       [](PortFileStream_t& s, const std::string&) { s.Write("a", 1); },
-       "<no filename> could't write."},
-      {"write a stream open for reading",
-       [](PortFileStream_t& s, const std::string& d) {
-         s.ReadOpen((d + "/f.bin").c_str());
-         s.Write("a", 1);
-       },
-       file + " could't write."},
-      {"read a stream open for writing",
-       [](PortFileStream_t& s, const std::string& d) {
-         char byte;
-         s.WriteOpen((d + "/w.bin").c_str());
-         s.Read(&byte, 1);
-       },
-       dir + "/w.bin could't read."},
-      {"seek a closed stream",
-       [](PortFileStream_t& s, const std::string&) { s.Seek(0, 0); },
-       "<no filename> file operation invalid."},
-      {"ask a closed stream its position",
-       [](PortFileStream_t& s, const std::string&) { s.GetPosition(); },
-       "<no filename> file operation invalid."},
-      {"ask a closed stream its length",
-       [](PortFileStream_t& s, const std::string&) { s.GetLength(); },
-       "<no filename> file operation invalid."},
-      {"seek before the start",
-       [](PortFileStream_t& s, const std::string& d) {
-         s.ReadOpen((d + "/f.bin").c_str());
-         s.Seek(-1, 0);
-       },
-       file + " file operation fail."},
-      {"write a negative length",
-       [](PortFileStream_t& s, const std::string& d) {
-         s.WriteOpen((d + "/w.bin").c_str());
-         s.Write("a", -1);
-       },
-       dir + "/w.bin illegal parameter."},
-      {"read a negative length",
-       [](PortFileStream_t& s, const std::string& d) {
-         char byte;
-         s.ReadOpen((d + "/f.bin").c_str());
-         s.Read(&byte, -1);
-       },
-       file + " illegal parameter."},
+      {kNever, [](PortFileStream_t& s) { s.Write("a", 1); }, " could't write."},
+      {kReading, [](PortFileStream_t& s) { s.Write("a", 1); }, " could't write."},
+      {kWriting, [](PortFileStream_t& s) { s.Read(&byte, 1); }, " could't read."},
+      {kNever, [](PortFileStream_t& s) { s.Seek(0, 0); }, " file operation invalid."},
+      {kNever, [](PortFileStream_t& s) { s.GetPosition(); }, " file operation invalid."},
+      {kNever, [](PortFileStream_t& s) { s.GetLength(); }, " file operation invalid."},
+      {kReading, [](PortFileStream_t& s) { s.Seek(-1, 0); }, " file operation fail."},
+      {kWriting, [](PortFileStream_t& s) { s.Write("a", -1); }, " illegal parameter."},
+      {kReading, [](PortFileStream_t& s) { s.Read(&byte, -1); }, " illegal parameter."},
   };
+  const std::string names[] = {"<no filename>", Path("f.bin"), Path("w.bin")};
   for (const Case& c : cases) {
-    SCOPED_TRACE(c.what);
+    SCOPED_TRACE(testing::Message() << c.opened << c.text);
     PortFileStream_t stream;
-    EXPECT_EQ(RaisedText([&] { c.action(stream, dir); }), c.text);
+    if (c.opened == kReading) stream.ReadOpen(names[kReading].c_str());
+    if (c.opened == kWriting) stream.WriteOpen(names[kWriting].c_str());
+    EXPECT_EQ(RaisedText([&] { c.action(stream); }), names[c.opened] + c.text);
   }
 }
 
@@ -162,15 +133,6 @@ TEST_F(FileStream, FailedOpenLeavesAClosedStreamNamingTheFile) {
   EXPECT_EQ(RaisedText([&] { stream.Write("a", 1); }), "<no filename> could't write.");
 }
 
-TEST_F(FileStream, BackslashesOpenAsSlashes) {
-  ASSERT_EQ(mkdir(Path("a").c_str(), 0700), 0);
-  PortFileStream_t stream;
-  stream.WriteOpen((dir + "\\a\\b.dat").c_str());
-  stream.WriteBuffer("xy", 2);
-  stream.Close();
-  EXPECT_EQ(Get("a/b.dat"), "xy");
-}
-
 TEST_F(FileStream, SeekOriginsAndLengthKeepingThePosition) {
   Put("s.bin", "abcdefghij");
   PortFileStream_t stream;
@@ -179,20 +141,12 @@ TEST_F(FileStream, SeekOriginsAndLengthKeepingThePosition) {
   stream.ReadBuffer(buffer, 4);
   EXPECT_EQ(stream.GetLength(), 10);
   EXPECT_EQ(stream.GetPosition(), 4);
-  stream.ReadBuffer(buffer, 1);
-  EXPECT_EQ(buffer[0], 'e');
 
-  struct Case {
-    PortStreamUnit_t offset;
-    int origin;
-    PortStreamUnit_t position;
-  };
-  // Origin 2 adds the offset to the end, as fseek does.
-  const Case cases[] = {{2, 0, 2}, {3, 1, 5}, {-2, 1, 3}, {-3, 2, 7}, {0, 2, 10}, {5, 2, 15}};
-  for (const Case& c : cases) {
-    SCOPED_TRACE(testing::Message() << c.offset << "," << c.origin);
-    stream.Seek(c.offset, c.origin);
-    EXPECT_EQ(stream.GetPosition(), c.position);
+  // {offset, origin, position}; origin 2 adds the offset to the end, as fseek does.
+  const int cases[][3] = {{2, 0, 2}, {3, 1, 5}, {-2, 1, 3}, {-3, 2, 7}, {0, 2, 10}, {5, 2, 15}};
+  for (const auto& c : cases) {
+    stream.Seek(c[0], c[1]);
+    EXPECT_EQ(stream.GetPosition(), c[2]) << c[0] << "," << c[1];
   }
   stream.Seek(-3, 2);
   stream.ReadBuffer(buffer, 3);
