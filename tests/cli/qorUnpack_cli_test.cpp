@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <cstdlib>
-#include <map>
 #include <string>
 #include <vector>
 
@@ -16,21 +15,14 @@
 
 namespace {
 
-typedef std::map<std::string, std::string> Files_t;
-
-const char kUsageHead[] = "usage: qorUnpack list ARCHIVE\n";
+const char kUsage[] =
+    "usage: qorUnpack list ARCHIVE\n"
+    "       qorUnpack test ARCHIVE\n"
+    "       qorUnpack extract ARCHIVE [-C DIR] [-f] [--no-verify]\n"
+    "       qorUnpack --version\n";
 
 ToolRun_t Unpack(const LinkTempDir_t& aDir, const std::vector<std::string>& aArgs) {
   return RunTool(QOR_UNPACK_BIN, aArgs, aDir.Path());
-}
-
-// Links aResp (with aFiles beside it) into aDir/a.LB and returns the archive's bytes.
-std::string LinkArchive(const LinkTempDir_t& aDir, const Files_t& aFiles, const std::string& aResp) {
-  for (const auto& file : aFiles) aDir.Put(file.first, file.second);
-  aDir.Put("a.ls", aResp);
-  ToolRun_t run = RunTool(QOR_LINK_BIN, {"a.ls"}, aDir.Path());
-  EXPECT_EQ(run.status, 0) << run.err;
-  return ReadBytes(aDir / "a.LB");
 }
 
 // Extracts aDir/aArchive into aDir/rt, relinks there and expects the very same bytes back.
@@ -51,24 +43,35 @@ std::string OwnHeaderFile(uint8_t aType, uint8_t aCompression, const std::string
                      aRealSize) + aBody;
 }
 
+// Every path below aRoot, relative to it, sorted.
+std::vector<std::string> Tree(const std::string& aRoot, const std::string& aRel = "") {
+  std::vector<std::string> paths;
+  DIR* d = opendir((aRoot + "/" + aRel).c_str());
+  while (struct dirent* ent = d != nullptr ? readdir(d) : nullptr) {
+    const std::string name = ent->d_name;
+    if (name == "." || name == "..") continue;
+    const std::string rel = aRel.empty() ? name : aRel + "/" + name;
+    paths.push_back(rel);
+    if (ent->d_type == DT_DIR) {
+      for (const std::string& below : Tree(aRoot, rel)) paths.push_back(below);
+    }
+  }
+  if (d != nullptr) closedir(d);
+  std::sort(paths.begin(), paths.end());
+  return paths;
+}
+
 TEST(QorUnpackCli, EveryMergeModeRoundTrips) {
   // An input archive whose entries lie back to back, as the archive merge reads them.
   const std::string merged = EntryHeader(3, 0, 1, 64, "SUB", 0) + std::string(48, 's') +
                              EntryHeader(1, 0x10, 0, 64, "DAT", 0) + "m.dat" + Zeros(11) +
                              std::string(32, 'm') + EndRecord();
-  const Files_t files = {
-      {"a.dat", "hello"},
-      {"big.txt", Pattern(300000, 1)},
-      {"empty.bin", ""},
-      {"noext", Pattern(700, 2)},
-      {"d1/same.dat", "first"},
-      {"d2/same.dat", "second"},
-      {"x.tex2d", std::string(48, 't')},
-      {"m.MB", OwnHeaderFile(1, 0, Pattern(100, 3), 0)},
-      {"c.AB", OwnHeaderFile(7, 1, "\x43\x41\xFF", 3)},
-      {"in.PB", merged},
-      {"raw.TB", EntryHeader(2, 0, 0, 21, "RAW", 0) + "as is" + Zeros(43)},
-  };
+  const FileSet_t files = {
+      {"a.dat", "hello"}, {"big.txt", Pattern(300000, 1)}, {"empty.bin", ""},
+      {"noext", Pattern(700, 2)}, {"d1/same.dat", "first"}, {"d2/same.dat", "second"},
+      {"x.tex2d", std::string(48, 't')}, {"m.MB", OwnHeaderFile(1, 0, Pattern(100, 3), 0)},
+      {"c.AB", OwnHeaderFile(7, 1, "\x43\x41\xFF", 3)}, {"in.PB", merged},
+      {"raw.TB", EntryHeader(2, 0, 0, 21, "RAW", 0) + "as is" + Zeros(43)}};
   const struct {
     const char* what;
     std::string resp;
@@ -85,35 +88,20 @@ TEST(QorUnpackCli, EveryMergeModeRoundTrips) {
   for (const auto& c : cases) {
     SCOPED_TRACE(c.what);
     LinkTempDir_t dir;
-    LinkArchive(dir, files, c.resp);
+    LinkFiles(dir, files, c.resp);
     ToolRun_t run = Unpack(dir, {"test", "a.LB"});
     EXPECT_EQ(run.status, 0) << run.out;
-    EXPECT_EQ(run.out.substr(run.out.size() - 5), ": OK\n") << run.out;
     ExpectRoundTrip(dir, "a.LB");
   }
 }
 
-TEST(QorUnpackCli, ExtractWritesFilesByTheirNames) {
+TEST(QorUnpackCli, ListAndExtractNameEveryEntry) {
   LinkTempDir_t dir;
-  LinkArchive(dir, {{"d1/same.dat", "first"}, {"d2/same.dat", "second"}, {"a.dat", "hello"},
-                    {"m.MB", OwnHeaderFile(4, 0, "body", 0)}},
-              "%setfilename\nd1/same.dat\nd2/same.dat id=7\n%nosetfilename\na.dat nocomp\nm.MB\n");
-  ASSERT_EQ(Unpack(dir, {"extract", "a.LB", "-C", "x"}).status, 0);
-  EXPECT_EQ(ReadBytes(dir / "x/same.dat"), "first");
-  EXPECT_EQ(ReadBytes(dir / "x/0001/same.dat"), "second");
-  EXPECT_EQ(ReadBytes(dir / "x/0002.dat"), "hello");
-  EXPECT_EQ(ReadBytes(dir / "x/0003.TB").size(), 64u);
-  EXPECT_EQ(ReadBytes(dir / "x/a.ls"),
-            "; extracted by qorUnpack; to rebuild the archive, run in this directory:\n"
-            ";   qorLink a.ls -o a.LB\n"
-            "%setfilename\nsame.dat\n0001/same.dat id=7\n"
-            "%nocompress\n%nosetfilename\n0002.dat\n0003.TB\n");
-}
-
-TEST(QorUnpackCli, ListShowsEveryEntryAndTheTotals) {
-  LinkTempDir_t dir;
-  LinkArchive(dir, {{"a.dat", "hello"}, {"z.bin", Zeros(40)}, {"e", ""}},
-              "%nocompress\na.dat id=3\n%comp\nz.bin setfilename\ne nocomp\n");
+  LinkFiles(dir,
+            {{"a.dat", "hello"}, {"z.bin", Zeros(40)}, {"e", ""}, {"d1/same.dat", "first"},
+             {"d2/same.dat", "second"}, {"m.MB", OwnHeaderFile(4, 0, "body", 0)}},
+            "%nocompress\na.dat id=3\n%comp\nz.bin setfilename\ne nocomp\n%setfilename\n"
+            "d1/same.dat nocomp\nd2/same.dat id=7 nocomp\n%nosetfilename\nm.MB nocomp\n");
   ToolRun_t run = Unpack(dir, {"list", "a.LB"});
   EXPECT_EQ(run.status, 0);
   EXPECT_EQ(run.err, "");
@@ -122,7 +110,22 @@ TEST(QorUnpackCli, ListShowsEveryEntryAndTheTotals) {
             "         0   01 stored          3         21          0 DAT              -\n"
             "        64   01 compressed      0         36         40 BIN              z.bin\n"
             "       128   01 stored          0         16          0 \\x00             -\n"
-            "3 entries, 9 bytes stored, 45 bytes expanded, end record at offset 192\n");
+            "       192   01 stored          0         37          0 DAT              same.dat\n"
+            "       256   01 stored          7         38          0 DAT              same.dat\n"
+            "       320   04 stored          9         20          0 MDL              -\n"
+            "6 entries, 24 bytes stored, 60 bytes expanded, end record at offset 384\n");
+
+  run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
+  EXPECT_EQ(run.status, 0) << run.err;
+  EXPECT_EQ(Tree(dir / "x"), std::vector<std::string>({"0000.dat", "0002", "0004", "0004/same.dat",
+                                                         "0005.TB", "a.ls", "same.dat", "z.bin"}));
+  EXPECT_EQ(ReadBytes(dir / "x/0004/same.dat"), "second");
+  EXPECT_EQ(ReadBytes(dir / "x/a.ls"),
+            "; extracted by qorUnpack; to rebuild the archive, run in this directory:\n"
+            ";   qorLink a.ls -o a.LB\n"
+            "%nocompress\n0000.dat id=3\n%compress\n%setfilename\nz.bin\n"
+            "%nocompress\n%nosetfilename\n0002\n%setfilename\nsame.dat\n0004/same.dat id=7\n"
+            "0005.TB\n");
 }
 
 std::string With(std::string aBytes, size_t aOffset, char aByte) {
@@ -134,7 +137,7 @@ TEST(QorUnpackCli, TestNamesEveryDamageWithItsOffset) {
   LinkTempDir_t base;
   // Entry 0 at 0: "hello" stored; entry 1 at 64: 40 zero bytes compressed to 20 28 00 FF
   // (payload at 80..83); entry 2 at 128: 100 bytes stored; the end record at 256.
-  const std::string sound = LinkArchive(
+  const std::string sound = LinkFiles(
       base, {{"a.dat", "hello"}, {"z.bin", Zeros(40)}, {"c.dat", std::string(100, 'c')}},
       "a.dat nocomp\nz.bin\nc.dat nocomp\n");
   ASSERT_EQ(sound.size(), 320u);
@@ -144,29 +147,27 @@ TEST(QorUnpackCli, TestNamesEveryDamageWithItsOffset) {
     const char* what;
     std::string bytes;
     std::vector<std::string> lines;
-    bool structural;  // extract refuses before writing anything
+    const char* absent;  // what a failed extract has not written; nullptr: extract relinks
   } cases[] = {
       {"cut in a header", sound.substr(0, 136),
-       {"entry 2, offset 128: the archive ends inside a header (8 of 16 bytes present)"}, true},
+       {"entry 2, offset 128: the archive ends inside a header (8 of 16 bytes present)"}, "x"},
       {"cut in a body", sound.substr(0, 200),
-       {"entry 2, offset 128: fileSize 116 runs past the end of the archive (72 bytes left)"}, true},
+       {"entry 2, offset 128: fileSize 116 runs past the end of the archive (72 bytes left)"}, "x"},
       {"cut in the padding", sound.substr(0, 250),
-       {"entry 2, offset 244: the archive ends inside the padding (6 of 12 bytes present)"}, true},
+       {"entry 2, offset 244: the archive ends inside the padding (6 of 12 bytes present)"}, "x"},
       {"huge fileSize", sound.substr(0, 132) + "\xF0\xFF\xFF\xFF" + sound.substr(136),
        {"entry 2, offset 128: fileSize 4294967280 runs past the end of the archive (192 bytes left)"},
-       true},
+       "x"},
       {"garbage after the end record", sound + "trailing",
-       {"offset 320: 8 bytes follow the end record"}, true},
+       {"offset 320: 8 bytes follow the end record"}, "x"},
       {"lost end mark", With(sound, 83, 0),
        {"entry 1, offset 80: the compressed body (4 bytes) does not expand to exactly realSize 40 bytes"},
-       false},
-      {"bad directive byte", With(sound, 80, '\xC5'),
-       {"entry 1, offset 80: the compressed body (4 bytes) does not expand to exactly realSize 40 bytes"},
-       false},
+       "x/a.ls"},
+      // Padding is kept as it is, in raw files.
       {"non-zero padding, twice", With(With(sound, 30, 1), 250, 'p'),
        {"entry 0, offset 30: non-zero byte in the padding",
         "entry 2, offset 250: non-zero byte in the padding"},
-       false},
+       nullptr},
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(c.what);
@@ -179,22 +180,19 @@ TEST(QorUnpackCli, TestNamesEveryDamageWithItsOffset) {
     ToolRun_t run = Unpack(dir, {"test", "a.LB"});
     EXPECT_EQ(run.status, 1);
     EXPECT_EQ(run.out, want);
-
+    if (c.absent == nullptr) {
+      ExpectRoundTrip(dir, "a.LB");
+      continue;
+    }
+    const std::string failure = "qorUnpack: " + prefix + c.lines[0] + "\n";
     run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
-    if (c.structural) {
-      EXPECT_EQ(run.status, 1);
-      EXPECT_EQ(run.err, "qorUnpack: " + prefix + c.lines[0] + "\n");
-      EXPECT_FALSE(FileExists(dir / "x"));
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.err, failure);
+    EXPECT_FALSE(FileExists(dir / c.absent));
+    if (c.absent == std::string("x")) {  // a damaged structure stops list as well
       run = Unpack(dir, {"list", "a.LB"});
       EXPECT_EQ(run.status, 1);
-      EXPECT_EQ(run.err, "qorUnpack: " + prefix + c.lines[0] + "\n");
-    } else if (c.lines[0].find("compressed") != std::string::npos) {
-      EXPECT_EQ(run.status, 1);
-      EXPECT_EQ(run.err, "qorUnpack: " + prefix + c.lines[0] + "\n");
-      EXPECT_FALSE(FileExists(dir / "x/a.ls"));
-    } else {
-      EXPECT_EQ(run.status, 0) << run.err;  // padding is kept as it is, in raw files
-      ExpectRoundTrip(dir, "a.LB");
+      EXPECT_EQ(run.err, failure);
     }
   }
 }
@@ -207,20 +205,6 @@ std::string NamedEntry(const std::string& aName, const std::string& aBody) {
          Zeros(QorPadLength(file_size));
 }
 
-// Every path below the temporary directory, relative to it.
-void ListTree(const std::string& aRoot, const std::string& aRel, std::vector<std::string>& aOut) {
-  DIR* d = opendir((aRoot + "/" + aRel).c_str());
-  ASSERT_NE(d, nullptr);
-  while (struct dirent* ent = readdir(d)) {
-    const std::string name = ent->d_name;
-    if (name == "." || name == "..") continue;
-    const std::string rel = aRel.empty() ? name : aRel + "/" + name;
-    aOut.push_back(rel);
-    if (ent->d_type == DT_DIR) ListTree(aRoot, rel, aOut);
-  }
-  closedir(d);
-}
-
 TEST(QorUnpackCli, HostileNamesStayInsideTheDirectory) {
   LinkTempDir_t dir;
   const char* names[] = {"../up.dat", "/tmp/abs.dat", "a/b.dat", "", "a\x01.dat",
@@ -231,14 +215,10 @@ TEST(QorUnpackCli, HostileNamesStayInsideTheDirectory) {
   dir.Put("x/keep", "");
   ToolRun_t run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
   ASSERT_EQ(run.status, 0) << run.err;
-  std::vector<std::string> tree;
-  ListTree(dir.Path(), "", tree);
-  std::sort(tree.begin(), tree.end());
-  const std::vector<std::string> want = {
-      "a.LB",       "x",          "x/0000.TB", "x/0001.TB", "x/0002.TB", "x/0003.TB", "x/0004.TB",
-      "x/0005.TB",  "x/0006.TB",  "x/0007.TB", "x/0009",    "x/0009/ok.dat", "x/a.ls", "x/keep",
-      "x/ok.dat"};
-  EXPECT_EQ(tree, want);
+  EXPECT_EQ(Tree(dir.Path()),
+            std::vector<std::string>({"a.LB", "x", "x/0000.TB", "x/0001.TB", "x/0002.TB", "x/0003.TB",
+                                      "x/0004.TB", "x/0005.TB", "x/0006.TB", "x/0007.TB", "x/0009",
+                                      "x/0009/ok.dat", "x/a.ls", "x/keep", "x/ok.dat"}));
   ExpectRoundTrip(dir, "a.LB");
 }
 
@@ -257,7 +237,7 @@ TEST(QorUnpackCli, PayloadsFromAnotherEncoderAreKeptRaw) {
 
 TEST(QorUnpackCli, ExistingFilesAreReplacedOnlyWithForce) {
   LinkTempDir_t dir;
-  LinkArchive(dir, {{"a.dat", "hello"}}, "a.dat setfilename\n");
+  LinkFiles(dir, {{"a.dat", "hello"}}, "a.dat setfilename\n");
   ASSERT_EQ(Unpack(dir, {"extract", "a.LB", "-C", "x"}).status, 0);
   dir.Put("x/a.dat", "changed");
   ToolRun_t run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
@@ -296,10 +276,7 @@ TEST(QorUnpackCli, UsageErrorsExitWithTwo) {
     ToolRun_t run = Unpack(dir, c.args);
     EXPECT_EQ(run.status, 2);
     EXPECT_EQ(run.out, "");
-    EXPECT_EQ(run.err, c.first_line + "\n" + kUsageHead +
-                           "       qorUnpack test ARCHIVE\n"
-                           "       qorUnpack extract ARCHIVE [-C DIR] [-f] [--no-verify]\n"
-                           "       qorUnpack --version\n");
+    EXPECT_EQ(run.err, c.first_line + "\n" + kUsage);
   }
   ToolRun_t run = Unpack(dir, {"--version"});
   EXPECT_EQ(run.status, 0);
