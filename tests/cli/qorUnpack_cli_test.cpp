@@ -163,7 +163,9 @@ TEST(QorUnpackCli, TestNamesEveryDamageWithItsOffset) {
       {"lost end mark", With(sound, 83, 0),
        {"entry 1, offset 80: the compressed body (4 bytes) does not expand to exactly realSize 40 bytes"},
        "x/a.ls"},
-      // Padding is kept as it is, in raw files.
+      // Kept as they are, in raw files.
+      {"name block without its zero byte", With(sound, 129, 0x10),
+       {"entry 2, offset 144: the name block holds no terminating zero byte"}, nullptr},
       {"non-zero padding, twice", With(With(sound, 30, 1), 250, 'p'),
        {"entry 0, offset 30: non-zero byte in the padding",
         "entry 2, offset 250: non-zero byte in the padding"},
