@@ -135,6 +135,29 @@ TEST(qorCompressorExact, RepeatsAroundOffsetLimits) { RunKind(3, 25 * kScale, 80
 TEST(qorCompressorExact, PeriodicData) { RunKind(4, 15 * kScale, 12000, 500); }
 TEST(qorCompressorExact, IncompressibleData) { RunKind(5, 5 * kScale, 8000, 600); }
 
+// Long stretches of two or three symbols make the search switch to its longer chains, other
+// kinds between them switch it back; the ends of inputs fall at every distance from a switch.
+TEST(qorCompressorExact, SmallAlphabetsBetweenOtherKinds) {
+  for (int i = 0; i < 3 * kScale; ++i) {
+    Rng rng(1000 + i);
+    std::string input;
+    const int length = Pick(rng, 40000, 100000);
+    while (static_cast<int>(input.size()) < length) {
+      const char a = static_cast<char>(Pick(rng, 0, 2));
+      const char b = static_cast<char>(Pick(rng, 1, 255));
+      const char c = Pick(rng, 0, 1) == 0 ? a : static_cast<char>(Pick(rng, 1, 255));
+      const int leng = Pick(rng, 12000, 30000);
+      for (int k = 0; k < leng; ++k) {
+        const int s = Pick(rng, 0, 2);
+        input += s == 0 ? a : s == 1 ? b : c;
+      }
+      kGenerators[Pick(rng, 1, 5)](input, Pick(rng, 200, 6000), rng);
+    }
+    input.resize(length - Pick(rng, 0, 1000));
+    ExpectSameAsReference(input, "small alphabets seed " + std::to_string(1000 + i));
+  }
+}
+
 TEST(qorCompressorExact, MixedKindsOfManySizes) {
   for (int i = 0; i < 60 * kScale; ++i) {
     Rng rng(700 + i);

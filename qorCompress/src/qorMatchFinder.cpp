@@ -12,6 +12,18 @@ const bool kLittleEndian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
 // small; the 4-byte one is sparse enough that chains rarely hold other bytes.
 const int kBits4 = 13;
 const int kBits3 = 10;
+const int kBits8 = 12;
+// One search in kSampleEvery has its 4-byte chain counted (at most kSampleCap entries); every
+// kDecideEvery searches the average decides whether 8-byte chains are kept.
+const int kSampleEvery = 16;
+const int kSampleCap = 64;
+#ifdef QOR_FLIP_CHAINS
+const int kDecideEvery = 32;  // test builds switch at every decision, and decide often
+#else
+const int kDecideEvery = 1024;
+#endif
+const int kOn8 = 24;
+const int kOff8 = 12;
 
 // Little-endian by construction; compilers make one load of it.
 inline uint32_t load32(const unsigned char* aPtr) {
@@ -34,19 +46,28 @@ inline int hashOf(uint32_t aValue, int aBits) {
   return static_cast<int>((aValue * 2654435761u) >> (32 - aBits));
 }
 
+inline int hash8Of(uint64_t aValue) {
+  return static_cast<int>((aValue * 0x9E3779B185EBCA87ull) >> (64 - kBits8));
+}
+
 }  // namespace
 
 qorMatchFinder_t::qorMatchFinder_t()
-    : window_(nullptr), base_(0), limit_(0), nextInsert_(0), runCount_(0) {
+    : window_(nullptr), base_(0), limit_(0), nextInsert_(0), runCount_(0), use8_(false),
+      searches_(0), sampled_(0) {
   const int run_heads = 1 << kBits3;
   // Each head table has one slot more: the chain of run positions, which no search walks.
   const int heads4 = (1 << kBits4) + 1;
   const int heads3 = (1 << kBits3) + 1;
-  head4_ = new int[heads4 + kMaxOffset + heads3 + (kNearMax + 1) + run_heads];
+  const int heads8 = 1 << kBits8;
+  head4_ = new int[heads4 + kMaxOffset + heads3 + (kNearMax + 1) + run_heads + heads8 + kMaxOffset];
   prev4_ = head4_ + heads4;
   head3_ = prev4_ + kMaxOffset;
   prev3_ = head3_ + heads3;
   headRun_ = prev3_ + (kNearMax + 1);
+  head8_ = headRun_ + run_heads;
+  prev8_ = head8_ + heads8;
+  std::memset(head8_, 0x80, sizeof(int) * heads8);
   // 0x80 bytes make every head a large negative offset: older than any position searched.
   std::memset(head4_, 0x80, sizeof(int) * heads4);
   std::memset(head3_, 0x80, sizeof(int) * heads3);
@@ -64,6 +85,15 @@ void qorMatchFinder_t::setWindow(const unsigned char* aWindow, int aBase, int aL
 }
 
 void qorMatchFinder_t::insertRange(int aAbsCur) {
+  if (use8_) {
+    insertPositions<true>(aAbsCur);
+  } else {
+    insertPositions<false>(aAbsCur);
+  }
+}
+
+template <bool kUse8>
+void qorMatchFinder_t::insertPositions(int aAbsCur) {
   int p = nextInsert_ > aAbsCur - kMaxOffset ? nextInsert_ : aAbsCur - kMaxOffset;
   nextInsert_ = aAbsCur;
   // Locals: stores into the tables would otherwise make the compiler reload the members.
@@ -73,6 +103,8 @@ void qorMatchFinder_t::insertRange(int aAbsCur) {
   int* const prev4 = prev4_;
   int* const head3 = head3_;
   int* const prev3 = prev3_;
+  int* const head8 = head8_;
+  int* const prev8 = prev8_;
   const int bits4 = kBits4;
   const int bits3 = kBits3;
   // The 4-byte chains need every position of the last 1024 that has 4 bytes, the 3-byte
@@ -87,7 +119,13 @@ void qorMatchFinder_t::insertRange(int aAbsCur) {
     const int h4 = in_run ? 1 << bits4 : hashOf(v, bits4);
     prev4[p & (kMaxOffset - 1)] = head4[h4];
     head4[h4] = p;
-    if (in_run && p + 4 < abs_limit && window[p + 4] != window[p]) addRun(window + p + 3, p + 4);
+    if (in_run) {
+      if (p + 4 < abs_limit && window[p + 4] != window[p]) addRun(window + p + 3, p + 4);
+    } else if (kUse8 && p + 8 <= abs_limit) {
+      const int h8 = hash8Of(load64(window + p));
+      prev8[p & (kMaxOffset - 1)] = head8[h8];
+      head8[h8] = p;
+    }
     if (p >= near_from) {
       const uint32_t v3 = v & 0xFFFFFF;
       const int h3 = v3 == (v & 0xFF) * 0x010101u ? 1 << bits3 : hashOf(v3, bits3);
@@ -106,13 +144,21 @@ void qorMatchFinder_t::insertRange(int aAbsCur) {
 
 int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
   insertUpTo(base_ + aCur);
+  return use8_ ? skipPositions<true>(aCur, aStop) : skipPositions<false>(aCur, aStop);
+}
+
+template <bool kUse8>
+int qorMatchFinder_t::skipPositions(int aCur, int aStop) {
   const unsigned char* const window = window_ - base_;
   int* const head4 = head4_;
   int* const prev4 = prev4_;
   int* const head3 = head3_;
   int* const prev3 = prev3_;
+  int* const head8 = head8_;
+  int* const prev8 = prev8_;
   const int bits4 = kBits4;
   const int bits3 = kBits3;
+  const int abs_limit = base_ + limit_;
   // Four bytes are read from each position.
   const int stop = base_ + (aStop < limit_ - 3 ? aStop : limit_ - 3);
   int abs = base_ + aCur;
@@ -134,9 +180,52 @@ int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
     head4[h4] = abs;
     prev3[abs & kNearMax] = head3[h3];
     head3[h3] = abs;
+    if (kUse8 && abs + 8 <= abs_limit) {
+      const int h8 = hash8Of(load64(s));
+      prev8[abs & (kMaxOffset - 1)] = head8[h8];
+      head8[h8] = abs;
+    }
   }
   nextInsert_ = abs;
   return abs - base_;
+}
+
+// Where the 4-byte chains run long (small alphabets, short periods), 8-byte chains find the
+// usual long matches after a few candidates; elsewhere they cost more to keep than they save.
+// The walk lengths of sampled searches decide, with a gap between the two thresholds so that
+// the mode changes seldom. Switching on fills the 8-byte chains from the last 1024 positions.
+void qorMatchFinder_t::sampleChain4(int aCur) {
+  const int abs_cur = base_ + aCur;
+  const int lowest = abs_cur - kMaxOffset;
+  int count = 0;
+  for (int j = head4_[hashOf(load32(window_ + aCur), kBits4)]; j >= lowest && count < kSampleCap;
+       j = prev4_[j & (kMaxOffset - 1)]) {
+    ++count;
+  }
+  sampled_ += count;
+  if ((searches_ & (kDecideEvery - 1)) != 0) return;
+  const int per_search = sampled_ / (kDecideEvery / kSampleEvery);
+  sampled_ = 0;
+#ifdef QOR_FLIP_CHAINS
+  const bool want8 = !use8_;
+#else
+  const bool want8 = use8_ ? per_search >= kOff8 : per_search > kOn8;
+#endif
+  if (want8 == use8_) return;
+  use8_ = want8;
+  if (!use8_) return;
+  std::memset(head8_, 0x80, sizeof(int) * (1 << kBits8));
+  const unsigned char* const window = window_ - base_;
+  const int abs_limit = base_ + limit_;
+  int p = nextInsert_ - kMaxOffset;
+  if (p < base_) p = base_;
+  for (; p < nextInsert_ && p + 8 <= abs_limit; ++p) {
+    const uint32_t v = load32(window + p);
+    if (v == (v & 0xFF) * 0x01010101u) continue;
+    const int h8 = hash8Of(load64(window + p));
+    prev8_[p & (kMaxOffset - 1)] = head8_[h8];
+    head8_[h8] = p;
+  }
 }
 
 void qorMatchFinder_t::addRun(const unsigned char* aLast, int aAbsEnd) {
@@ -199,14 +288,14 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
   return best;
 }
 
-inline int qorMatchFinder_t::findChain(int aCur, int aMinLeng, int aCap, int& aOffset) {
+inline int qorMatchFinder_t::findChain(const int* aHead, const int* aPrev, int aCur,
+                                        int aMinLeng, int aCap, int& aOffset) {
   const unsigned char* cur = window_ + aCur;
   const int abs_cur = base_ + aCur;
   const int lowest = abs_cur - kMaxOffset;
-  int best = (aMinLeng > 4 ? aMinLeng : 4) - 1;
+  int best = aMinLeng - 1;
   int best_pos = -1;
-  for (int j = head4_[hashOf(load32(cur), kBits4)]; j >= lowest;
-       j = prev4_[j & (kMaxOffset - 1)]) {
+  for (int j = *aHead; j >= lowest; j = aPrev[j & (kMaxOffset - 1)]) {
     const unsigned char* cand = window_ + (j - base_);
     // A longer match must agree on the 4 bytes ending at the current best length.
     if (load32(cand + best - 3) != load32(cur + best - 3)) continue;
@@ -242,7 +331,19 @@ int qorMatchFinder_t::find(int aCur, int aRunLeng, int aMinLeng, int& aOffset) {
   if (aMinLeng > cap) return 0;
   insertUpTo(base_ + aCur);
   if (aRunLeng >= 4) return findRun(aCur, aRunLeng, aMinLeng, cap, aOffset);
-  const int leng = cap >= 4 ? findChain(aCur, aMinLeng, cap, aOffset) : 0;
+  const unsigned char* cur = window_ + aCur;
+  int cap4 = cap;
+  if (cap >= 8 && (++searches_ & (kSampleEvery - 1)) == 0) sampleChain4(aCur);
+  if (use8_ && cap >= 8) {
+    // Every match of 8 or more starts in the 8-byte chain, nearest first.
+    const int leng = findChain(head8_ + hash8Of(load64(cur)), prev8_, aCur,
+                               aMinLeng > 8 ? aMinLeng : 8, cap, aOffset);
+    if (leng > 0 || aMinLeng >= 8) return leng;
+    cap4 = 7;  // none of 8: the nearest of 7 is the answer
+  }
+  const int leng = cap4 >= 4 ? findChain(head4_ + hashOf(load32(cur), kBits4), prev4_, aCur,
+                                         aMinLeng > 4 ? aMinLeng : 4, cap4, aOffset)
+                             : 0;
   // Without a match of 4 or more, a match of 3 can only win when it is near: the nearest
   // one within 255 is then the answer that counts.
   if (leng == 0 && aMinLeng <= 3) return findNear3(aCur, aOffset);

@@ -51,11 +51,15 @@ class qorMatchFinder_t {
     if (nextInsert_ < aAbsCur) insertRange(aAbsCur);
   }
   void insertRange(int aAbsCur);
+  template <bool kUse8> void insertPositions(int aAbsCur);
+  template <bool kUse8> int skipPositions(int aCur, int aStop);
   void addRun(const unsigned char* aLast, int aAbsEnd);
   int matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom, int aCap) const;
   int findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, int& aOffset);
-  int findChain(int aCur, int aMinLeng, int aCap, int& aOffset);
+  int findChain(const int* aHead, const int* aPrev, int aCur, int aMinLeng, int aCap,
+                int& aOffset);
   int findNear3(int aCur, int& aOffset);
+  void sampleChain4(int aCur);
 
   const unsigned char* window_;
   int base_;
@@ -67,10 +71,15 @@ class qorMatchFinder_t {
   int* head3_;  // newest position per hash of 3 bytes not all equal
   int* prev3_;  // ring of 256
   int* headRun_;  // newest run index per hash of (run byte, byte after the run)
+  int* head8_;  // newest position per hash of 8 bytes whose first 4 are not all equal
+  int* prev8_;  // ring of 1024
   // Runs of 4 or more bytes ending in the last 1024 bytes number at most 206.
   static const int kRunRing = 512;
   Run_t runs_[kRunRing];  // ring of the runs listed last
   int runCount_;
+  bool use8_;     // the 8-byte chains hold every eligible position of the last 1024
+  unsigned searches_;
+  int sampled_;   // 4-byte chain entries counted since the last decision
 };
 
 #endif
