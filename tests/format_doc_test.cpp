@@ -3,17 +3,15 @@
 // file and files given beside them, then walked by the archive reader.
 #include <gtest/gtest.h>
 
-#include <cstdio>
 #include <fstream>
-#include <map>
 #include <sstream>
 #include <string>
 #include <vector>
 
-#include "port/src/memorystream.h"
 #include "qorCompress/src/qorCompress.h"
 #include "src/archivereader.h"
 #include "tests/support/linkfixture.h"
+#include "tests/support/teststream.h"
 
 namespace {
 
@@ -59,58 +57,34 @@ const DocBlock_t* Find(const std::vector<DocBlock_t>& aBlocks, const std::string
   return nullptr;
 }
 
-std::string Drain(PortMemoryStream_t& aStream) {
-  std::string bytes(static_cast<size_t>(aStream.GetLength()), '\0');
-  aStream.Seek(0, 0);
-  if (!bytes.empty()) aStream.ReadBuffer(&bytes[0], static_cast<int>(bytes.size()));
-  return bytes;
-}
-
 std::string Compress(const std::string& aInput) {
-  PortMemoryStream_t src, dst;
-  src.WriteBuffer(aInput.data(), static_cast<int>(aInput.size()));
-  src.Seek(0, 0);
+  TestStream_t src(aInput);
+  TestStream_t dst;
   qorCompressor_t().compress(dst, src, static_cast<int>(aInput.size()));
-  return Drain(dst);
+  return dst.Content();
 }
 
-// The expanded bytes, or "refused" when the expander rejects the payload.
-std::string ExpandOrRefuse(const std::string& aPayload, int aRealSize) {
-  PortMemoryStream_t src, dst;
-  src.WriteBuffer(aPayload.data(), static_cast<int>(aPayload.size()));
-  src.Seek(0, 0);
-  try {
-    qorExpander_t().expand(dst, src, static_cast<int>(aPayload.size()), aRealSize);
-  } catch (const char* text) {
-    return std::string("refused:") + text;
-  }
-  return Drain(dst);
-}
-
-TEST(FormatDoc, PayloadExamplesCompressAndExpand) {
+// Each input compresses to its payload and expands back; each bad payload is refused.
+TEST(FormatDoc, PayloadExamplesCompressExpandOrAreRefused) {
   const std::vector<DocBlock_t> blocks = ReadDocBlocks();
-  int checked = 0;
-  for (const DocBlock_t& input : blocks) {
-    if (input.role != "payload-input") continue;
-    SCOPED_TRACE(input.label);
-    const DocBlock_t* payload = Find(blocks, "payload", input.label);
-    ASSERT_NE(payload, nullptr);
-    EXPECT_EQ(Compress(input.bytes), payload->bytes);
-    EXPECT_EQ(ExpandOrRefuse(payload->bytes, static_cast<int>(input.bytes.size())), input.bytes);
-    ++checked;
+  int inputs = 0;
+  int bad = 0;
+  for (const DocBlock_t& block : blocks) {
+    SCOPED_TRACE(block.label);
+    if (block.role == "payload-input") {
+      const DocBlock_t* payload = Find(blocks, "payload", block.label);
+      ASSERT_NE(payload, nullptr);
+      EXPECT_EQ(Compress(block.bytes), payload->bytes);
+      EXPECT_EQ(Expand(payload->bytes, static_cast<uint32_t>(block.bytes.size())), block.bytes);
+      ++inputs;
+    } else if (block.role == "bad-payload") {
+      EXPECT_EQ(FailureText([&] { Expand(block.bytes, std::stoi(block.arg)); }),
+                " invalid file format.");
+      ++bad;
+    }
   }
-  EXPECT_EQ(checked, 5);
-}
-
-TEST(FormatDoc, MalformedPayloadsAreRefused) {
-  int checked = 0;
-  for (const DocBlock_t& bad : ReadDocBlocks()) {
-    if (bad.role != "bad-payload") continue;
-    SCOPED_TRACE(bad.label);
-    EXPECT_EQ(ExpandOrRefuse(bad.bytes, std::stoi(bad.arg)), "refused: invalid file format.");
-    ++checked;
-  }
-  EXPECT_EQ(checked, 7);
+  EXPECT_EQ(inputs, 5);
+  EXPECT_EQ(bad, 7);
 }
 
 TEST(FormatDoc, ArchiveExamplesAreWhatQorLinkWrites) {
@@ -119,18 +93,15 @@ TEST(FormatDoc, ArchiveExamplesAreWhatQorLinkWrites) {
   for (const DocBlock_t& archive : blocks) {
     if (archive.role != "archive") continue;
     SCOPED_TRACE(archive.label);
-    LinkTempDir_t dir;
     const DocBlock_t* resp = Find(blocks, "response", archive.label);
     ASSERT_NE(resp, nullptr);
-    dir.Put("doc.ls", resp->text);
+    FileSet_t files;
     for (const DocBlock_t& file : blocks) {
-      if (file.role == "file" && file.label == archive.label) dir.Put(file.arg, file.bytes);
+      if (file.role == "file" && file.label == archive.label) files[file.arg] = file.bytes;
     }
-    ToolRun_t run = RunTool(QOR_LINK_BIN, {"doc.ls"}, dir.Path());
-    ASSERT_EQ(run.status, 0) << run.err;
-    EXPECT_EQ(ReadBytes(dir / "doc.LB"), archive.bytes);
-
-    qorArchiveReader_t reader((dir / "doc.LB").c_str());
+    LinkTempDir_t dir;
+    EXPECT_EQ(LinkFiles(dir, files, resp->text), archive.bytes);
+    qorArchiveReader_t reader((dir / "a.LB").c_str());
     while (reader.Next()) EXPECT_TRUE(reader.CheckPadding());
     EXPECT_EQ(reader.State(), kQorWalkEndRecord);
     EXPECT_TRUE(reader.Problems().empty());
