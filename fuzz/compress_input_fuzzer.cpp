@@ -58,7 +58,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* aData, size_t aSize) {
   const std::string input = InputOf(aData, aSize);
   qorCompressor_t compressor;
   const std::string payload = Compress(compressor, input);
-  FuzzRequire(payload == ReferenceCompressor().Compress(input), "payload differs from the exhaustive one");
+  FuzzRequire(payload == ReferenceCompressor().Compress(input),
+              "payload differs from the exhaustive reference's");
   FuzzRequire(Compress(compressor, input) == payload, "a reused compressor differs");
 
   PortMemoryStream_t source;

@@ -1,5 +1,5 @@
-// Property: on any payload, payload length and realSize the decoder either writes exactly the
-// bytes a plain byte-at-a-time decoder gives, or raises " invalid file format." when that one refuses.
+// Property: given any payload, payload length and realSize, the decoder writes exactly what a
+// plain byte-at-a-time decoder gives, or raises " invalid file format." where that one refuses.
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -54,7 +54,8 @@ bool PlainExpand(const std::string& aPayload, int aRealSize, std::string& aOut) 
         if (pos + (code - 2) > n) return false;
         offset = byte(pos++);
         if (code == 4) offset |= byte(pos++) << 8;
-        if (offset == 0 || offset > kHistory || offset > static_cast<int>(aOut.size())) return false;
+        if (offset == 0 || offset > kHistory) return false;
+        if (offset > static_cast<int>(aOut.size())) return false;
         for (int k = 0; k < leng; ++k) aOut += aOut[aOut.size() - offset];
         break;
       }

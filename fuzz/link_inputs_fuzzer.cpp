@@ -1,5 +1,5 @@
-// Property: a link run over a generated response file and inputs either writes an archive that
-// qorUnpack test accepts and whose entries hold the inputs, or fails with one of the tool's messages and leaves no archive.
+// Property: a link over generated lists and inputs writes an archive that qorUnpack test accepts
+// and whose entries hold the inputs, or fails with a message of the tool's and leaves nothing.
 #include <sys/stat.h>
 
 #include <algorithm>

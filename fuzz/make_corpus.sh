@@ -11,7 +11,10 @@ trap 'rm -rf "$work"' EXIT
 
 le32() { od -An -tu4 -j "$2" -N4 "$1" | tr -d ' '; }
 # The 4 bytes of a number, little-endian, as printf escapes.
-le32_bytes() { printf '\\x%02x\\x%02x\\x%02x\\x%02x' $(($1 & 255)) $(($1 >> 8 & 255)) $(($1 >> 16 & 255)) $(($1 >> 24 & 255)); }
+le32_bytes() {
+  printf '\\x%02x\\x%02x\\x%02x\\x%02x' \
+    $(($1 & 255)) $(($1 >> 8 & 255)) $(($1 >> 16 & 255)) $(($1 >> 24 & 255))
+}
 
 cp -r "$here/../example/data" "$work/data"
 cd "$work"

@@ -1,5 +1,5 @@
-// Property: a serializer reader driven by any sequence of reads over any stream raises only
-// " read error." or " invalid file format.", and after Term() every pointer read is null or an object.
+// Property: any sequence of serializer reads over any stream raises only " read error." or
+// " invalid file format.", and after Term() every pointer read is null or a registered object.
 #include <cstddef>
 #include <cstdint>
 #include <cstring>

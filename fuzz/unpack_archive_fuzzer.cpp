@@ -1,5 +1,5 @@
-// Property: qorUnpack list, test and extract on any archive bytes fail only with a message, and
-// extract writes only inside its directory; an archive that test accepts extracts and relinks byte for byte.
+// Property: list, test and extract on any bytes fail only with a message, extract writes only in
+// its directory, and an archive that test accepts extracts and relinks to the same bytes.
 #include <unistd.h>
 
 #include <climits>
@@ -50,7 +50,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* aData, size_t aSize) {
 
   Failure([&] { UnpackList(archive.c_str(), FuzzNullOutput()); });
   int problems = -1;
-  const std::string test_failure = Failure([&] { problems = UnpackTest(archive.c_str(), FuzzNullOutput()); });
+  const std::string test_failure =
+      Failure([&] { problems = UnpackTest(archive.c_str(), FuzzNullOutput()); });
   FuzzRequire(test_failure.empty(), "test raised instead of reporting the problems");
   const std::string extract_failure =
       Failure([&] { UnpackExtract(archive.c_str(), (dir / "x").c_str(), qorExtractOptions_t()); });

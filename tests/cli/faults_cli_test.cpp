@@ -90,7 +90,9 @@ TEST(LinkFaults, ArchiveIntoAPipe) {
   ToolRun_t run = Link(dir, {"list.ls", "-o", "pipe.LB"});
   std::string received;
   char buffer[256];
-  for (size_t got; (got = fread(buffer, 1, sizeof buffer, reader)) > 0;) received.append(buffer, got);
+  for (size_t got; (got = fread(buffer, 1, sizeof buffer, reader)) > 0;) {
+    received.append(buffer, got);
+  }
   pclose(reader);
   EXPECT_EQ(0, run.status);
   EXPECT_EQ("", run.err);
