@@ -29,18 +29,15 @@ Lines SplitLines(const std::string& aText) {
   return lines;
 }
 
-Lines ReadAll(PortStream_t& aStream) {
-  PortStringReader_t reader(&aStream);
+// The lines up to eof(); past it gets() returns an empty line.
+Lines ReadAll(const std::string& aText, int aStart = 0) {
+  TestStream_t stream(aText);
+  stream.Seek(aStart, 0);
+  PortStringReader_t reader(&stream);
   Lines lines;
   while (!reader.eof()) lines.push_back(ToStd(reader.gets()));
   EXPECT_EQ("", ToStd(reader.gets()));
   return lines;
-}
-
-Lines ReadAll(const std::string& aText, int aStart = 0) {
-  TestStream_t stream(aText);
-  stream.Seek(aStart, 0);
-  return ReadAll(stream);
 }
 
 // Reads to the end, going on after each read error; returns the lines and counts the errors.
@@ -89,32 +86,23 @@ TEST(StringReader, LineEndings) {
   }
 }
 
-TEST(StringReader, EmptyStreamIsAtEofAtOnce) {
-  TestStream_t stream;
-  PortStringReader_t reader(&stream);
-  EXPECT_TRUE(reader.eof());
-  EXPECT_EQ(0, reader.gets().GetLength());
-  EXPECT_TRUE(reader.eof());
-}
-
 // The stream's position runs ahead by whole fills, so after the first line it shows the
 // buffer's size: the buffer doubles only when a line with its terminator does not fit.
 TEST(StringReader, BufferDoublesOnlyForALineThatDoesNotFit) {
-  const struct {
-    int line_length;
-    int position_after_first_line;
-  } cases[] = {{10, 1024}, {1023, 1024}, {1024, 2048}, {2047, 2048}, {3000, 4096}};
+  // {first line's length, position after reading it}
+  const int cases[][2] = {{10, 1024}, {1023, 1024}, {1024, 2048}, {2047, 2048}, {3000, 4096}};
   const std::string tail = NumberedLines(800);
   for (const auto& c : cases) {
-    const std::string first(c.line_length, 'q');
+    SCOPED_TRACE(c[0]);
+    const std::string first(c[0], 'q');
     TestStream_t stream(first + "\n" + tail);
     PortStringReader_t reader(&stream);
     EXPECT_EQ(0, stream.GetPosition());
     EXPECT_EQ(first, ToStd(reader.gets()));
-    EXPECT_EQ(c.position_after_first_line, stream.GetPosition()) << c.line_length;
+    EXPECT_EQ(c[1], stream.GetPosition());
     Lines rest;
     while (!reader.eof()) rest.push_back(ToStd(reader.gets()));
-    EXPECT_EQ(SplitLines(tail), rest) << c.line_length;
+    EXPECT_EQ(SplitLines(tail), rest);
   }
 }
 
