@@ -56,8 +56,8 @@ qorMatchFinder_t::qorMatchFinder_t()
     : window_(nullptr), base_(0), limit_(0), nextInsert_(0), runCount_(0), use8_(false),
       searches_(0), sampled_(0) {
   const int run_heads = 1 << kBits3;
-  // Each head table has one slot more: the chain of run positions, which no search walks.
-  const int heads4 = (1 << kBits4) + 1;
+  // The 3-byte table has one slot more: the chain of run positions, which no search walks.
+  const int heads4 = 1 << kBits4;
   const int heads3 = (1 << kBits3) + 1;
   const int heads8 = 1 << kBits8;
   head4_ = new int[heads4 + kMaxOffset + heads3 + (kNearMax + 1) + run_heads + heads8 + kMaxOffset];
@@ -109,29 +109,36 @@ void qorMatchFinder_t::insertPositions(int aAbsCur) {
   const int bits3 = kBits3;
   // The 4-byte chains need every position of the last 1024 that has 4 bytes, the 3-byte
   // table those of the last 255 that have 3. A position whose first 4 (or 3) bytes are all
-  // equal lies in a run; runs are listed once instead (addRun), and such positions go to the
-  // spare slot of the head table, which no search walks: long runs make no long chains.
+  // equal lies in a run; runs are listed once instead (addRun), and such positions enter no
+  // 4-byte chain and only the spare slot of the 3-byte table: long runs make no long chains.
   const int stop4 = abs_limit - 3 < aAbsCur ? abs_limit - 3 : aAbsCur;
   const int near_from = aAbsCur - kNearMax;
+  const auto insert4 = [&](int aPos, uint32_t aValue) {
+    if (aValue == (aValue & 0xFF) * 0x01010101u) {
+      // Its ring slot is never read: no chain leads to it.
+      if (aPos + 4 < abs_limit && window[aPos + 4] != window[aPos]) {
+        addRun(window + aPos + 3, aPos + 4);
+      }
+      return;
+    }
+    const int h4 = hashOf(aValue, bits4);
+    prev4[aPos & (kMaxOffset - 1)] = head4[h4];
+    head4[h4] = aPos;
+    if (kUse8 && aPos + 8 <= abs_limit) {
+      const int h8 = hash8Of(load64(window + aPos));
+      prev8[aPos & (kMaxOffset - 1)] = head8[h8];
+      head8[h8] = aPos;
+    }
+  };
+  const int far_stop = near_from < stop4 ? near_from : stop4;
+  for (; p < far_stop; ++p) insert4(p, load32(window + p));
   for (; p < stop4; ++p) {
     const uint32_t v = load32(window + p);
-    const bool in_run = v == (v & 0xFF) * 0x01010101u;
-    const int h4 = in_run ? 1 << bits4 : hashOf(v, bits4);
-    prev4[p & (kMaxOffset - 1)] = head4[h4];
-    head4[h4] = p;
-    if (in_run) {
-      if (p + 4 < abs_limit && window[p + 4] != window[p]) addRun(window + p + 3, p + 4);
-    } else if (kUse8 && p + 8 <= abs_limit) {
-      const int h8 = hash8Of(load64(window + p));
-      prev8[p & (kMaxOffset - 1)] = head8[h8];
-      head8[h8] = p;
-    }
-    if (p >= near_from) {
-      const uint32_t v3 = v & 0xFFFFFF;
-      const int h3 = v3 == (v & 0xFF) * 0x010101u ? 1 << bits3 : hashOf(v3, bits3);
-      prev3[p & kNearMax] = head3[h3];
-      head3[h3] = p;
-    }
+    insert4(p, v);
+    const uint32_t v3 = v & 0xFFFFFF;
+    const int h3 = v3 == (v & 0xFF) * 0x010101u ? 1 << bits3 : hashOf(v3, bits3);
+    prev3[p & kNearMax] = head3[h3];
+    head3[h3] = p;
   }
   for (; p < aAbsCur; ++p) {
     if (p < near_from || p + 2 >= abs_limit) continue;
