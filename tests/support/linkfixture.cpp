@@ -112,11 +112,7 @@ std::string EntryHeader(uint8_t aType, uint8_t aCompression, uint16_t aUserId,
 
 std::string Zeros(size_t aCount) { return std::string(aCount, '\0'); }
 
-std::string EndRecord() {
-  static const unsigned char kEnd[16] = {0xFF, 0x00, 0x00, 0x00, 0x10, 0x00, 0x00, 0x00,
-                                         0x45, 0x4E, 0x44, 0x30, 0x00, 0x00, 0x00, 0x00};
-  return std::string(reinterpret_cast<const char*>(kEnd), sizeof kEnd) + Zeros(48);
-}
+std::string EndRecord() { return EntryHeader(0xFF, 0, 0, 16, "END0", 0) + Zeros(48); }
 
 uint32_t Le32At(const std::string& aBytes, size_t aOffset) {
   uint32_t value = 0;
