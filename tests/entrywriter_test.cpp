@@ -22,58 +22,57 @@ std::string LinkLines(const LinkTempDir_t& dir, std::string lines) {
   return ReadBytes(dir / "out.LB");
 }
 
+// Each case links one file: `directives`, then the file's line with `words`.
 TEST(EntryWriter, StoredEntryHeaderNameBlockAndPadding) {
   const struct {
     std::string file;
     size_t length;
-    std::string lines;
+    const char* directives;
+    const char* words;
     uint16_t id;
     const char* magic;  // four bytes
     size_t block;       // name block length; the block holds the file's base name
     size_t padding;
   } cases[] = {
-      {"a.dat", 0, "@/a.dat nocomp\n", 0, "DAT", 0, 48},
-      {"a.dat", 47, "@/a.dat nocomp\n", 0, "DAT", 0, 1},
-      {"a.dat", 48, "@/a.dat nocomp\n", 0, "DAT", 0, 0},
-      {"a.dat", 49, "@/a.dat nocomp\n", 0, "DAT", 0, 63},
-      {"a.dat", 63, "@/a.dat nocomp\n", 0, "DAT", 0, 49},
-      {"a.dat", 64, "@/a.dat nocomp\n", 0, "DAT", 0, 48},
-      {"a.dat", 65, "@/a.dat nocomp\n", 0, "DAT", 0, 47},
-      {"a.tex2d", 1, "%nocomp\n@/a.tex2d\n", 0, "TEX2", 0, 47},
-      {"x", 1, "%nocomp\n@/x\n", 0, "\0\0\0", 0, 47},
-      {"x.tmxa", 1, "%nocomp\n@/x.tmxa\n", 0, "TMXA", 0, 47},
-      {"x.Tm2", 1, "%nocomp\n@/x.Tm2\n", 0, "TM2", 0, 47},
-      {"x.tm", 1, "%nocomp\n@/x.tm\n", 0, "TM\0", 0, 47},
-      {"d.v/x", 1, "%nocomp\n@/d.v/x\n", 0, "\0\0\0", 0, 47},
-      {"x.", 1, "%nocomp\n@/x.\n", 0, "\0\0\0", 0, 47},
-      {"x.a-b", 1, "%nocomp\n@/x.a-b\n", 0, "A-B", 0, 47},
-      {"a.dat", 5, "@/a.dat nocomp id=0x10\n", 16, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat nocomp id=010\n", 8, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat nocomp id=\n", 0, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat nocomp id=-1\n", 0xFFFF, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat nocomp id=65536\n", 0, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat ID=5 nocomp\n", 5, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat nocomp id=3 id=7\n", 3, "DAT", 0, 43},
-      {"a.dat", 5, "%comp\n%setfilename\n@/a.dat NoCompress NOSETFILENAME x\n", 0, "DAT", 0, 43},
-      {"a.dat", 5, "%nocomp\n@/a.dat compression setfile idx=4\n", 0, "DAT", 0, 43},
-      {"a.dat", 5, "@/a.dat nocomp setfilename\n", 0, "DAT", 16, 27},
-      {"data/img/a.dat", 5, "%setfilename\n%nocomp\n@/data/img/a.dat\n", 0, "DAT", 16, 27},
-      {std::string(11, 'f') + ".bin", 5, "%setfilename\n%nocomp\n@/fffffffffff.bin\n", 0, "BIN", 16,
-       27},
-      {std::string(12, 'g') + ".bin", 5, "%setfilename\n%nocomp\n@/gggggggggggg.bin\n", 0, "BIN", 32,
-       11},
-      {std::string(43, 'h') + ".bin", 5, "%setfilename\n%nocomp\n@/" + std::string(43, 'h') +
-       ".bin\n", 0, "BIN", 48, 59},
+      {"a.dat", 0, "", "nocomp", 0, "DAT", 0, 48},
+      {"a.dat", 47, "", "nocomp", 0, "DAT", 0, 1},
+      {"a.dat", 48, "", "nocomp", 0, "DAT", 0, 0},
+      {"a.dat", 49, "", "nocomp", 0, "DAT", 0, 63},
+      {"a.dat", 63, "", "nocomp", 0, "DAT", 0, 49},
+      {"a.dat", 64, "", "nocomp", 0, "DAT", 0, 48},
+      {"a.dat", 65, "", "nocomp", 0, "DAT", 0, 47},
+      {"a.tex2d", 1, "%nocomp\n", "", 0, "TEX2", 0, 47},
+      {"x", 1, "%nocomp\n", "", 0, "\0\0\0", 0, 47},
+      {"x.tmxa", 1, "%nocomp\n", "", 0, "TMXA", 0, 47},
+      {"x.Tm2", 1, "%nocomp\n", "", 0, "TM2", 0, 47},
+      {"x.tm", 1, "%nocomp\n", "", 0, "TM\0", 0, 47},
+      {"d.v/x", 1, "%nocomp\n", "", 0, "\0\0\0", 0, 47},
+      {"x.", 1, "%nocomp\n", "", 0, "\0\0\0", 0, 47},
+      {"x.a-b", 1, "%nocomp\n", "", 0, "A-B", 0, 47},
+      {"a.dat", 5, "", "nocomp id=0x10", 16, "DAT", 0, 43},
+      {"a.dat", 5, "", "nocomp id=010", 8, "DAT", 0, 43},
+      {"a.dat", 5, "", "nocomp id=", 0, "DAT", 0, 43},
+      {"a.dat", 5, "", "nocomp id=-1", 0xFFFF, "DAT", 0, 43},
+      {"a.dat", 5, "", "nocomp id=65536", 0, "DAT", 0, 43},
+      {"a.dat", 5, "", "ID=5 nocomp", 5, "DAT", 0, 43},
+      {"a.dat", 5, "", "nocomp id=3 id=7", 3, "DAT", 0, 43},
+      {"a.dat", 5, "%comp\n%setfilename\n", "NoCompress NOSETFILENAME x", 0, "DAT", 0, 43},
+      {"a.dat", 5, "%nocomp\n", "compression setfile idx=4", 0, "DAT", 0, 43},
+      {"a.dat", 5, "", "nocomp setfilename", 0, "DAT", 16, 27},
+      {"data/img/a.dat", 5, "%setfilename\n%nocomp\n", "", 0, "DAT", 16, 27},
+      {std::string(11, 'f') + ".bin", 5, "%setfilename\n%nocomp\n", "", 0, "BIN", 16, 27},
+      {std::string(12, 'g') + ".bin", 5, "%setfilename\n%nocomp\n", "", 0, "BIN", 32, 11},
+      {std::string(43, 'h') + ".bin", 5, "%setfilename\n%nocomp\n", "", 0, "BIN", 48, 59},
   };
   for (const auto& c : cases) {
-    SCOPED_TRACE(c.lines);
+    SCOPED_TRACE(c.file + " " + c.words);
     LinkTempDir_t dir;
     const std::string data = Pattern(c.length, 3);
     dir.Put(c.file, data);
     const std::string base = c.file.substr(c.file.rfind('/') + 1);
     const std::string block = c.block == 0 ? "" : base + Zeros(c.block - base.size());
     const uint32_t file_size = static_cast<uint32_t>(16 + c.block + c.length);
-    EXPECT_EQ(LinkLines(dir, c.lines),
+    EXPECT_EQ(LinkLines(dir, c.directives + ("@/" + c.file) + " " + c.words + "\n"),
               EntryHeader(1, static_cast<uint8_t>(c.block), c.id, file_size, c.magic, 0) + block +
                   data + Zeros(c.padding) + EndRecord());
   }
