@@ -52,7 +52,8 @@ TEST(ExtractDir, NeverWritesThroughLinksOrIntoNonDirectories) {
   EXPECT_EQ(ReadBytes(tmp / "out/a.dat"), "new");
 
   dir.Place(0, "b");
-  EXPECT_EQ(FailureText([&] { dir.Place(1, "b"); }), tmp / "out/0001: exists and is not a directory");
+  EXPECT_EQ(FailureText([&] { dir.Place(1, "b"); }),
+            tmp / "out/0001: exists and is not a directory");
   EXPECT_EQ(FailureText([&] { qorExtractDir_t bad((tmp / "out/a.dat").c_str(), false); }),
             tmp / "out/a.dat: not a directory");
 }
