@@ -218,9 +218,10 @@ TEST(QorUnpackCli, HostileNamesStayInsideTheDirectory) {
   ToolRun_t run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
   ASSERT_EQ(run.status, 0) << run.err;
   EXPECT_EQ(Tree(dir.Path()),
-            std::vector<std::string>({"a.LB", "x", "x/0000.TB", "x/0001.TB", "x/0002.TB", "x/0003.TB",
-                                      "x/0004.TB", "x/0005.TB", "x/0006.TB", "x/0007.TB", "x/0009",
-                                      "x/0009/ok.dat", "x/a.ls", "x/keep", "x/ok.dat"}));
+            std::vector<std::string>({"a.LB", "x", "x/0000.TB", "x/0001.TB", "x/0002.TB",
+                                      "x/0003.TB", "x/0004.TB", "x/0005.TB", "x/0006.TB",
+                                      "x/0007.TB", "x/0009", "x/0009/ok.dat", "x/a.ls", "x/keep",
+                                      "x/ok.dat"}));
   ExpectRoundTrip(dir, "a.LB");
 }
 
@@ -260,32 +261,32 @@ TEST(QorUnpackCli, ExistingFilesAreReplacedOnlyWithForce) {
   EXPECT_EQ(ReadBytes(dir / "out/a.dat"), archive);
 }
 
-TEST(QorUnpackCli, UsageErrorsExitWithTwo) {
+// Usage errors exit with 2, failures with 1.
+TEST(QorUnpackCli, CommandLineStatusesAndTexts) {
+  const std::string usage = kUsage;
   const struct {
     std::vector<std::string> args;
-    std::string first_line;
+    int status;
+    std::string out;
+    std::string err;
   } cases[] = {
-      {{}, "qorUnpack: no command given"},
-      {{"unpack", "a.LB"}, "qorUnpack: unknown command 'unpack'"},
-      {{"list"}, "qorUnpack: no archive given"},
-      {{"test", "a.LB", "b.LB"}, "qorUnpack: more than one archive given ('b.LB')"},
-      {{"extract", "a.LB", "-C"}, "qorUnpack: -C needs a directory"},
-      {{"extract", "a.LB", "-x"}, "qorUnpack: unknown option '-x'"},
-      {{"list", "a.LB", "-f"}, "qorUnpack: unknown option '-f'"},
+      {{}, 2, "", "qorUnpack: no command given\n" + usage},
+      {{"unpack", "a.LB"}, 2, "", "qorUnpack: unknown command 'unpack'\n" + usage},
+      {{"list"}, 2, "", "qorUnpack: no archive given\n" + usage},
+      {{"test", "a.LB", "b.LB"}, 2, "", "qorUnpack: more than one archive given ('b.LB')\n" + usage},
+      {{"extract", "a.LB", "-C"}, 2, "", "qorUnpack: -C needs a directory\n" + usage},
+      {{"extract", "a.LB", "-x"}, 2, "", "qorUnpack: unknown option '-x'\n" + usage},
+      {{"list", "a.LB", "-f"}, 2, "", "qorUnpack: unknown option '-f'\n" + usage},
+      {{"--version"}, 0, "qorUnpack version 0.01\n", ""},
+      {{"test", "missing.LB"}, 1, "", "qorUnpack: missing.LB could't open.\n"},
   };
   LinkTempDir_t dir;
   for (const auto& c : cases) {
     ToolRun_t run = Unpack(dir, c.args);
-    EXPECT_EQ(run.status, 2);
-    EXPECT_EQ(run.out, "");
-    EXPECT_EQ(run.err, c.first_line + "\n" + kUsage);
+    EXPECT_EQ(run.status, c.status);
+    EXPECT_EQ(run.out, c.out);
+    EXPECT_EQ(run.err, c.err);
   }
-  ToolRun_t run = Unpack(dir, {"--version"});
-  EXPECT_EQ(run.status, 0);
-  EXPECT_EQ(run.out, "qorUnpack version 0.01\n");
-  run = Unpack(dir, {"test", "missing.LB"});
-  EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "qorUnpack: missing.LB could't open.\n");
 }
 
 // The real-data case: set QOR_CORPUS_DIR to a directory made by bench/make-corpus.sh.
