@@ -3,6 +3,7 @@
 // sanitizer build checks the latter).
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <random>
 #include <string>
 
@@ -51,6 +52,121 @@ std::string VariedInput(int aLength, uint32_t aSeed) {
   }
   out.resize(aLength);
   return out;
+}
+
+// Writes a payload directive by directive, with the bytes it stands for beside it.
+struct PayloadBuilder_t {
+  std::string payload;
+  std::string expanded;
+  void Head(int aCode, int aLeng, bool aLongForm = false) {
+    if (aLeng < 32 && !aLongForm) {
+      payload += static_cast<char>(aCode | aLeng);
+    } else {
+      payload += static_cast<char>(aCode);
+      payload += static_cast<char>(aLeng & 0xFF);
+      payload += static_cast<char>(aLeng >> 8);
+    }
+  }
+  void Normal(const std::string& aBytes) {
+    Head(0x00, static_cast<int>(aBytes.size()));
+    payload += aBytes;
+    expanded += aBytes;
+  }
+  void Fill(unsigned char aValue, int aLeng) {
+    Head(aValue == 0 ? 0x20 : 0x40, aLeng);
+    if (aValue != 0) payload += static_cast<char>(aValue);
+    expanded.append(aLeng, static_cast<char>(aValue));
+  }
+  void Copy(int aOffset, int aLeng, bool aFar) {
+    Head(aFar ? 0x80 : 0x60, aLeng);
+    payload += static_cast<char>(aOffset & 0xFF);
+    if (aFar) payload += static_cast<char>(aOffset >> 8);
+    for (int i = 0; i < aLeng; ++i) expanded += expanded[expanded.size() - aOffset];
+  }
+  void Words(const std::string& aLow) {
+    Head(0xA0, static_cast<int>(aLow.size()));
+    payload += aLow;
+    for (char c : aLow) {
+      expanded += c;
+      expanded += '\0';
+    }
+  }
+  // Any directive of at most 40 units, including forms the encoder never writes (rle of 0,
+  // far copies from near offsets, long forms of short lengths).
+  void Random(std::mt19937& aRng) {
+    const int leng = 1 + static_cast<int>(aRng() % 40);
+    const bool long_form = aRng() % 8 == 0;
+    const int reach = static_cast<int>(std::min<size_t>(expanded.size(), 1024));
+    switch (aRng() % 5) {
+      case 0: {
+        std::string bytes;
+        for (int i = 0; i < leng; ++i) bytes += static_cast<char>(aRng());
+        Head(0x00, leng, long_form);
+        payload += bytes;
+        expanded += bytes;
+        break;
+      }
+      case 1:
+        Fill(static_cast<unsigned char>(aRng() % 3 == 0 ? 0 : aRng()), leng);
+        break;
+      case 2: {
+        std::string low;
+        for (int i = 0; i < leng; ++i) low += static_cast<char>(aRng());
+        Words(low);
+        break;
+      }
+      default:
+        if (reach == 0) break;
+        const int offset = 1 + static_cast<int>(aRng() % (aRng() % 2 ? 20 : reach));
+        Copy(offset < reach ? offset : reach, leng, offset > 255 || aRng() % 4 == 0);
+    }
+  }
+};
+
+// Expands byte by byte as the format describes, or returns false for a malformed payload.
+bool PlainExpand(const std::string& aPayload, int aRealSize, std::string& aOut) {
+  aOut.clear();
+  size_t i = 0;
+  const auto take = [&](size_t n) { return i + n <= aPayload.size(); };
+  const auto byte = [&](size_t k) { return static_cast<unsigned char>(aPayload[k]); };
+  if (aPayload.empty()) return aRealSize == 0;
+  for (;;) {
+    if (!take(1)) return false;
+    const int directive = byte(i++);
+    if (directive == 0xFF) break;
+    int leng = directive & 0x1F;
+    if (leng == 0) {
+      if (!take(2)) return false;
+      leng = byte(i) | byte(i + 1) << 8;
+      i += 2;
+      if (leng == 0) return false;
+    }
+    const int code = directive >> 5;
+    const size_t operand = code == 0 || code == 5 ? leng : code == 2 || code == 3 ? 1 : code == 4 ? 2 : 0;
+    if (code > 5 || !take(operand)) return false;
+    const int offset = code == 3 ? byte(i) : code == 4 ? byte(i) | byte(i + 1) << 8 : 0;
+    if (code >= 3 && code <= 4 && (offset == 0 || offset > 1024 || offset > static_cast<int>(aOut.size())))
+      return false;
+    for (int k = 0; k < leng; ++k) {
+      if (code == 0 || code == 5) aOut += aPayload[i + k];
+      if (code == 1 || code == 5) aOut += '\0';
+      if (code == 2) aOut += aPayload[i];
+      if (code >= 3 && code <= 4) aOut += aOut[aOut.size() - offset];
+    }
+    i += operand;
+    if (aOut.size() > static_cast<size_t>(aRealSize)) return false;
+  }
+  return i == aPayload.size() && aOut.size() == static_cast<size_t>(aRealSize);
+}
+
+// The expander's verdict and output against PlainExpand's.
+void ExpectSameAsPlain(const std::string& aPayload, int aRealSize, const std::string& aWhat) {
+  std::string plain;
+  if (PlainExpand(aPayload, aRealSize, plain)) {
+    ASSERT_TRUE(plain == ExpandString(aPayload, aRealSize)) << aWhat;
+  } else {
+    ASSERT_EQ(kInvalid, ExpandError(aPayload, aRealSize)) << aWhat;
+  }
 }
 
 TEST(qorExpander, ExpandsDirectivesTheEncoderNeverWrites) {
@@ -157,6 +273,96 @@ TEST(qorExpander, CorruptedPayloadsExpandToRealSizeOrAreRejected) {
     }
   }
   EXPECT_GT(rejected, 0);
+}
+
+// Copies that reach too far or not at all, also with enough history and payload after them
+// that the expander takes them on its unchecked path.
+TEST(qorExpander, RejectsBadCopiesAfterLongHistory) {
+  const struct {
+    int offset;
+    int leng;
+    bool far;
+    bool valid;
+  } kCases[] = {
+      {0, 3, false, false},    {0, 31, false, false}, {0, 4, true, false},  {1025, 4, true, false},
+      {65535, 31, true, false}, {1024, 31, true, true}, {1, 31, false, true}, {255, 3, true, true},
+  };
+  std::mt19937 rng(3);
+  for (const auto& c : kCases) {
+    PayloadBuilder_t b;
+    std::string bytes;
+    for (int i = 0; i < 1100; ++i) bytes += static_cast<char>(rng());
+    b.Normal(bytes);
+    b.Head(c.far ? 0x80 : 0x60, c.leng);
+    b.payload += static_cast<char>(c.offset & 0xFF);
+    if (c.far) b.payload += static_cast<char>(c.offset >> 8);
+    for (int i = 0; i < c.leng; ++i) {
+      b.expanded += c.valid ? b.expanded[b.expanded.size() - c.offset] : '\0';
+    }
+    b.Normal(bytes.substr(0, 40));
+    b.payload += '\xFF';
+    const int real_size = static_cast<int>(b.expanded.size());
+    if (c.valid) {
+      EXPECT_TRUE(b.expanded == ExpandString(b.payload, real_size)) << c.offset;
+    } else {
+      EXPECT_EQ(kInvalid, ExpandError(b.payload, real_size)) << c.offset;
+    }
+  }
+}
+
+// Each kind and length of short directive ending just before, at and just after the 256 KiB
+// output block, where the expander's unchecked stores must hand over to its checked ones.
+TEST(qorExpander, ShortDirectivesAroundTheOutputBlockEnd) {
+  const int kBlock = 0x40000;
+  std::mt19937 rng(5);
+  for (int kind = 0; kind < 6; ++kind) {
+    for (int leng : {1, 2, 15, 16, 17, 31}) {
+      for (int shift = -1; shift <= 1; ++shift) {
+        PayloadBuilder_t b;
+        const int out_leng = kind == 5 ? 2 * leng : leng;
+        const int zeros = kBlock + shift - out_leng - 1100;
+        for (int left = zeros; left > 0; left -= 0xFFFF) b.Fill(0, std::min(left, 0xFFFF));
+        std::string history;
+        for (int i = 0; i < 1100; ++i) history += static_cast<char>(rng());
+        b.Normal(history);
+        switch (kind) {
+          case 0: b.Normal(history.substr(0, leng)); break;
+          case 1: b.Fill(0, leng); break;
+          case 2: b.Fill(0x41, leng); break;
+          case 3: b.Copy(1 + leng % 7, leng, false); break;
+          case 4: b.Copy(1024, leng, true); break;
+          default: b.Words(history.substr(0, leng));
+        }
+        for (int i = 0; i < 20; ++i) b.Random(rng);
+        b.payload += '\xFF';
+        const int real_size = static_cast<int>(b.expanded.size());
+        ASSERT_TRUE(b.expanded == ExpandString(b.payload, real_size)) << kind << " " << leng << " " << shift;
+        ASSERT_EQ(kInvalid, ExpandError(b.payload, real_size - 1)) << kind << " " << leng << " " << shift;
+      }
+    }
+  }
+}
+
+// Random directive streams, also of forms the encoder never writes, whole and damaged: the
+// expander accepts exactly what the plain byte-by-byte reading accepts, with the same bytes.
+TEST(qorExpander, AgreesWithPlainExpansionOnRandomPayloads) {
+  std::mt19937 rng(7);
+  for (int round = 0; round < 400; ++round) {
+    PayloadBuilder_t b;
+    const int target = 1 + static_cast<int>(rng() % 4000);
+    while (static_cast<int>(b.expanded.size()) < target) b.Random(rng);
+    b.payload += '\xFF';
+    std::string payload = b.payload;
+    const int real_size = static_cast<int>(b.expanded.size());
+    ASSERT_TRUE(b.expanded == ExpandString(payload, real_size)) << round;
+    const int damage = static_cast<int>(rng() % 4);
+    for (int i = 0; i < damage; ++i) {
+      const size_t at = rng() % payload.size();
+      // Most damage in the directive bytes, where the checks are.
+      payload[at] = static_cast<char>(rng() % 2 ? rng() : (payload[at] & 0xE0) | (rng() & 0x1F));
+    }
+    ExpectSameAsPlain(payload, real_size + static_cast<int>(rng() % 3) - 1, std::to_string(round));
+  }
 }
 
 TEST(qorExpander, SourceShorterThanPayloadLengthRaisesReadError) {

@@ -1,10 +1,22 @@
 // qorExpander_t: the checked decoder. Payload and output pass through two fixed buffers; each
 // directive is checked once, as a whole, against what is left of the payload, of realSize and
 // of the history, and then copied without further checks.
+//
+// Two paths share the work. The fast one takes the short directives (at most 32 bytes of
+// output) that lie well inside both buffers, without a branch on their kind: a table indexed
+// by the directive byte gives the lengths, and every kind becomes "load 16 bytes, shuffle,
+// store 32". Everything else (long forms, block and payload ends, the first 1024 output
+// bytes, any malformed directive) goes through the checked one, one directive at a time.
+#include <cstdint>
 #include <cstring>
 
 #include "port/src/error.h"
 #include "qorCompress/src/qorCompress.h"
+
+#if defined(__x86_64__) || defined(__i386__)
+#include <immintrin.h>
+#define QOR_EXPAND_SHUFFLE 1
+#endif
 
 namespace {
 
@@ -19,38 +31,185 @@ const int kSlack = 64;                     // fixed-size moves may run this far 
 
 [[noreturn]] void invalid() { PortErrorThrow(kInvalidFormat); }
 
-inline uint64_t load64(const unsigned char* aPtr) {
-  uint64_t v;
-  std::memcpy(&v, aPtr, sizeof v);
-  return v;
-}
-
-inline void store64(unsigned char* aPtr, uint64_t aValue) { std::memcpy(aPtr, &aValue, sizeof aValue); }
-
 // Copies aLeng bytes from aOffset back; an overlapping copy repeats the last aOffset bytes.
-// Moves of up to 16 bytes never read what they write, since each is no longer than the
-// offset. May write up to 15 bytes past the end.
+// Below 16 the first period-multiple of at least 16 bytes goes byte by byte; from there on
+// 16-byte moves at that distance never read what they write. May write up to 15 bytes past
+// the end.
 inline void sdCopy(unsigned char* aDst, int aOffset, int aLeng) {
   const unsigned char* src = aDst - aOffset;
-  if (aOffset >= 16) {
-    for (int k = 0; k < aLeng; k += 16) std::memcpy(aDst + k, src + k, 16);
-  } else if (aOffset >= 8) {
-    for (int k = 0; k < aLeng; k += 8) std::memcpy(aDst + k, src + k, 8);
-  } else if (aOffset == 1) {
-    std::memset(aDst, src[0], aLeng);
-  } else {
-    for (int k = 0; k < aLeng; ++k) aDst[k] = src[k];
+  int dist = aOffset;
+  int k = 0;
+  if (aOffset < 16) {
+    dist = aOffset * ((16 + aOffset - 1) / aOffset);
+    for (; k < dist && k < aLeng; ++k) aDst[k] = src[k];
   }
+  for (; k < aLeng; k += 16) std::memcpy(aDst + k, aDst + k - dist, 16);
 }
 
 // Fills aLeng bytes with aValue; may write up to kShort - 1 bytes past the end.
 inline void fill(unsigned char* aDst, unsigned char aValue, int aLeng) {
-  if (aLeng <= kShort) {
-    std::memset(aDst, aValue, kShort);
-  } else {
-    std::memset(aDst, aValue, aLeng);
-  }
+  std::memset(aDst, aValue, aLeng <= kShort ? kShort : aLeng);
 }
+
+// Expands the directive at `in` with every check; returns false at the end mark. `produced`
+// counts the bytes before `out`; the buffer keeps kHistory of them before `out`.
+bool checkedDirective(const unsigned char*& in, const unsigned char* in_end, unsigned char*& out,
+                      int64_t produced, int64_t realSize) {
+  if (in == in_end) invalid();
+  const int directive = *in++;
+  if (directive == 0xFF) return false;
+  const int code = directive >> 5;
+  int leng = directive & 0x1F;
+  if (leng == 0) {
+    if (in_end - in < 2) invalid();
+    leng = in[0] | in[1] << 8;
+    in += 2;
+    if (leng == 0) invalid();
+  }
+  const int out_leng = code == 5 ? 2 * leng : leng;
+  if (out_leng > realSize - produced) invalid();
+  const int64_t avail = in_end - in;
+  switch (code) {
+    case 0:
+      if (avail < leng) invalid();
+      std::memcpy(out, in, leng);
+      in += leng;
+      break;
+    case 1:
+      fill(out, 0, leng);
+      break;
+    case 2:
+      if (avail < 1) invalid();
+      fill(out, *in++, leng);
+      break;
+    case 3:
+    case 4: {
+      if (avail < code - 2) invalid();
+      const int offset = code == 3 ? in[0] : in[0] | in[1] << 8;
+      in += code - 2;
+      if (offset == 0 || offset > kHistory || offset > produced) invalid();
+      sdCopy(out, offset, leng);
+      break;
+    }
+    case 5:
+      if (avail < leng) invalid();
+      for (int k = 0; k < leng; ++k) {
+        out[2 * k] = in[k];
+        out[2 * k + 1] = 0;
+      }
+      in += leng;
+      break;
+    default:
+      invalid();
+  }
+  out += out_leng;
+  return true;
+}
+
+#ifdef QOR_EXPAND_SHUFFLE
+
+// What the fast path needs to know of a directive byte.
+struct FastOp_t {
+  int32_t outLeng;   // kNotFast for what the checked path must take
+  uint16_t offMask;  // the offset's bytes after the directive byte; 0 for kinds without one
+  uint8_t inLeng;
+  uint8_t shape;     // index into the shuffles; sd copies add min(offset, 16)
+};
+
+const int32_t kNotFast = 1 << 30;  // larger than any room the fast path is given
+
+// Shapes: 1-15 repeat the first n loaded bytes (sd copies from a near offset, rle as n = 1);
+// 16 copies 32 bytes as they are; 17 writes zeros; 18 spreads 16 bytes into 16-bit units.
+const int kDirect = 16;
+const int kZeros = 17;
+const int kWords = 18;
+const int kShapes = 19;
+
+struct FastTables_t {
+  FastOp_t op[256];
+  unsigned char low[kShapes][16];   // shuffle for the first 16 bytes written
+  unsigned char high[kShapes][16];  // shuffle for the second 16; 0x80 yields 0
+  unsigned char zeros[16];
+  FastTables_t() : op(), low(), high(), zeros() {
+    for (int b = 0; b < 256; ++b) {
+      const int code = b >> 5;
+      const int leng = b & 0x1F;
+      FastOp_t& o = op[b];
+      o.outLeng = kNotFast;
+      o.offMask = 0;
+      o.inLeng = 1;
+      o.shape = kZeros;
+      if (leng == 0 || code > 5 || (code == 5 && 2 * leng > kShort)) continue;
+      o.outLeng = code == 5 ? 2 * leng : leng;
+      const uint8_t in_leng[] = {static_cast<uint8_t>(1 + leng), 1, 2, 2, 3,
+                                 static_cast<uint8_t>(1 + leng)};
+      const uint8_t shape[] = {kDirect, kZeros, 1, 0, 0, kWords};
+      o.inLeng = in_leng[code];
+      o.shape = shape[code];
+      o.offMask = code == 3 ? 0xFF : code == 4 ? 0xFFFF : 0;
+    }
+    for (int s = 0; s < kShapes; ++s) {
+      for (int i = 0; i < 16; ++i) {
+        unsigned char lo = 0x80;
+        unsigned char hi = 0x80;
+        if (s >= 1 && s < kDirect) {
+          lo = static_cast<unsigned char>(i % s);
+          hi = static_cast<unsigned char>((16 + i) % s);
+        } else if (s == kDirect) {
+          lo = static_cast<unsigned char>(i);
+        } else if (s == kWords && i % 2 == 0) {
+          lo = static_cast<unsigned char>(i / 2);
+          hi = static_cast<unsigned char>(8 + i / 2);
+        }
+        low[s][i] = lo;
+        high[s][i] = hi;
+      }
+    }
+  }
+};
+
+const FastTables_t kFast;
+
+// Expands directives from `in` while each one starts before in_stop (so that it and its
+// 33-byte reads lie in the payload buffer) and ends at or before out_stop (its 32-byte writes
+// then fall into the slack). Needs kHistory bytes of history before `out`. Returns at the
+// first directive it leaves to the checked path.
+__attribute__((target("ssse3"))) const unsigned char* fastRun(const unsigned char* in,
+                                                              const unsigned char* in_stop,
+                                                              unsigned char*& out_ref,
+                                                              unsigned char* out_stop) {
+  unsigned char* out = out_ref;
+  while (in < in_stop) {
+    const FastOp_t op = kFast.op[in[0]];
+    const uint32_t offset = (in[1] | in[2] << 8) & op.offMask;
+    const bool is_sd = op.offMask != 0;
+    if ((out_stop - out < op.outLeng) | (is_sd & (offset - 1 >= static_cast<uint32_t>(kHistory))))
+      break;
+    const unsigned shape = op.shape + (offset < 16 ? offset : 16);
+    const unsigned char* src = is_sd ? out - offset : in + 1;
+    const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(src));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out),
+                     _mm_shuffle_epi8(v, _mm_loadu_si128(reinterpret_cast<const __m128i*>(
+                                             kFast.low[shape]))));
+    // Loaded after the first store: a copy from 16 to 31 bytes back reads some of it.
+    const unsigned char* src2 = shape == kDirect ? src + 16 : kFast.zeros;
+    const __m128i v2 = _mm_or_si128(
+        _mm_shuffle_epi8(v, _mm_loadu_si128(reinterpret_cast<const __m128i*>(kFast.high[shape]))),
+        _mm_loadu_si128(reinterpret_cast<const __m128i*>(src2)));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 16), v2);
+    in += op.inLeng;
+    out += op.outLeng;
+  }
+  out_ref = out;
+  return in;
+}
+
+const bool kHaveShuffle = [] {
+  __builtin_cpu_init();
+  return __builtin_cpu_supports("ssse3") != 0;
+}();
+
+#endif
 
 // A buffer owned for one expand() call.
 struct ByteBuffer_t {
@@ -82,8 +241,7 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
   unsigned char* out = out_start;
   unsigned char* out_flushed = out_start;  // bytes before it have gone to dstStrm
   int64_t out_total = 0;                   // bytes expanded before out_start
-  bool ended = false;
-  while (!ended) {
+  for (;;) {
     if (in_end - in < kMaxDirective && in_remain > 0) {
       const int kept = static_cast<int>(in_end - in);
       std::memmove(in_buf.p, in, kept);
@@ -99,72 +257,14 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
       out_total += out - out_start;
       out = out_flushed = out_start;
     }
-    // Up to these limits neither a refill nor a flush is due.
-    const unsigned char* const in_stop = in_remain > 0 ? in_end - kMaxDirective : in_end;
-    unsigned char* const out_stop = out_start + kOutBlock;
-    do {
-      if (in == in_end) invalid();
-      const int directive = *in++;
-      if (directive == 0xFF) {
-        ended = true;
-        break;
-      }
-      const int code = directive >> 5;
-      int leng = directive & 0x1F;
-      if (leng == 0) {
-        if (in_end - in < 2) invalid();
-        leng = in[0] | in[1] << 8;
-        in += 2;
-        if (leng == 0) invalid();
-      }
-      const int64_t produced = out_total + (out - out_start);
-      const int out_leng = code == 5 ? 2 * leng : leng;
-      if (out_leng > realSize - produced) invalid();
-      const int64_t avail = in_end - in;
-      if (code == 0 || code == 3 || code == 4) {
-        // Normal data and sd copies are both copies, from the payload or from the output;
-        // one path for both keeps the kind out of the branches of the common short case.
-        const bool is_sd = code != 0;
-        const int operand = is_sd ? code - 2 : leng;  // payload bytes after the length
-        if (avail < operand) invalid();
-        // The buffer's slack makes reading a second offset byte harmless.
-        const int offset = is_sd ? (in[0] | (code == 4 ? in[1] << 8 : 0)) : kHistory + 1;
-        if (is_sd && (offset == 0 || offset > kHistory || offset > produced)) invalid();
-        const unsigned char* src = is_sd ? out - offset : in;
-        in += operand;
-        if (leng <= kShort && offset >= 16) {
-          // Each 16-byte move reads only bytes already final, as none is longer than the
-          // offset; the slack of both buffers takes the overrun.
-          std::memcpy(out, src, 16);
-          std::memcpy(out + 16, src + 16, 16);
-        } else if (is_sd) {
-          sdCopy(out, offset, leng);
-        } else {
-          std::memcpy(out, src, leng);
-        }
-      } else {
-        switch (code) {
-          case 1:
-            fill(out, 0, leng);
-            break;
-          case 2:
-            if (avail < 1) invalid();
-            fill(out, *in++, leng);
-            break;
-          case 5:
-            if (avail < leng) invalid();
-            for (int k = 0; k < leng; ++k) {
-              out[2 * k] = in[k];
-              out[2 * k + 1] = 0;
-            }
-            in += leng;
-            break;
-          default:
-            invalid();
-        }
-      }
-      out += out_leng;
-    } while (in <= in_stop && out < out_stop);
+#ifdef QOR_EXPAND_SHUFFLE
+    if (kHaveShuffle && out_total + (out - out_start) >= kHistory && in_end - in > kShort) {
+      const int64_t room = realSize - out_total < kOutBlock ? realSize - out_total : kOutBlock;
+      in = fastRun(in, in_end - kShort, out, out_start + room);
+    }
+#endif
+    const int64_t produced = out_total + (out - out_start);
+    if (!checkedDirective(in, in_end, out, produced, realSize)) break;
   }
   if (in != in_end || in_remain != 0) invalid();
   if (out_total + (out - out_start) != realSize) invalid();
