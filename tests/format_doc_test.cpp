@@ -1,6 +1,6 @@
 // Runs every worked example of docs/format.md: payloads are compressed and expanded, bad
 // payloads must be refused, and archives are linked by the built qorLink from the response
-// file and files given beside them, then walked by the archive reader.
+// file and files given beside them.
 #include <gtest/gtest.h>
 
 #include <fstream>
@@ -9,7 +9,6 @@
 #include <vector>
 
 #include "qorCompress/src/qorCompress.h"
-#include "src/archivereader.h"
 #include "tests/support/linkfixture.h"
 #include "tests/support/teststream.h"
 
@@ -101,10 +100,6 @@ TEST(FormatDoc, ArchiveExamplesAreWhatQorLinkWrites) {
     }
     LinkTempDir_t dir;
     EXPECT_EQ(LinkFiles(dir, files, resp->text), archive.bytes);
-    qorArchiveReader_t reader((dir / "a.LB").c_str());
-    while (reader.Next()) EXPECT_TRUE(reader.CheckPadding());
-    EXPECT_EQ(reader.State(), kQorWalkEndRecord);
-    EXPECT_TRUE(reader.Problems().empty());
     ++checked;
   }
   EXPECT_EQ(checked, 3);
