@@ -118,7 +118,7 @@ TEST(QorUnpackCli, ListAndExtractNameEveryEntry) {
   run = Unpack(dir, {"extract", "a.LB", "-C", "x"});
   EXPECT_EQ(run.status, 0) << run.err;
   EXPECT_EQ(Tree(dir / "x"), std::vector<std::string>({"0000.dat", "0002", "0004", "0004/same.dat",
-                                                         "0005.TB", "a.ls", "same.dat", "z.bin"}));
+                                                       "0005.TB", "a.ls", "same.dat", "z.bin"}));
   EXPECT_EQ(ReadBytes(dir / "x/0004/same.dat"), "second");
   EXPECT_EQ(ReadBytes(dir / "x/a.ls"),
             "; extracted by qorUnpack; to rebuild the archive, run in this directory:\n"
@@ -273,7 +273,8 @@ TEST(QorUnpackCli, CommandLineStatusesAndTexts) {
       {{}, 2, "", "qorUnpack: no command given\n" + usage},
       {{"unpack", "a.LB"}, 2, "", "qorUnpack: unknown command 'unpack'\n" + usage},
       {{"list"}, 2, "", "qorUnpack: no archive given\n" + usage},
-      {{"test", "a.LB", "b.LB"}, 2, "", "qorUnpack: more than one archive given ('b.LB')\n" + usage},
+      {{"test", "a.LB", "b.LB"}, 2, "",
+       "qorUnpack: more than one archive given ('b.LB')\n" + usage},
       {{"extract", "a.LB", "-C"}, 2, "", "qorUnpack: -C needs a directory\n" + usage},
       {{"extract", "a.LB", "-x"}, 2, "", "qorUnpack: unknown option '-x'\n" + usage},
       {{"list", "a.LB", "-f"}, 2, "", "qorUnpack: unknown option '-f'\n" + usage},
