@@ -15,12 +15,12 @@ const int kBits3 = 10;
 const int kBits8 = 12;
 // One search in kSampleEvery has its 4-byte chain counted (at most kSampleCap entries); every
 // kDecideEvery searches the average decides whether 8-byte chains are kept.
-const int kSampleEvery = 16;
+const int kSampleEvery = 64;
 const int kSampleCap = 64;
 #ifdef QOR_FLIP_CHAINS
-const int kDecideEvery = 32;  // test builds switch at every decision, and decide often
+const int kDecideEvery = kSampleEvery;  // test builds switch at every decision, and decide often
 #else
-const int kDecideEvery = 1024;
+const int kDecideEvery = 4096;
 #endif
 const int kOn8 = 24;
 const int kOff8 = 12;
@@ -298,19 +298,22 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
 inline int qorMatchFinder_t::findChain(const int* aHead, const int* aPrev, int aCur,
                                         int aMinLeng, int aCap, int& aOffset) {
   const unsigned char* cur = window_ + aCur;
+  const unsigned char* const window = window_ - base_;  // indexed by absolute offsets
   const int abs_cur = base_ + aCur;
   const int lowest = abs_cur - kMaxOffset;
   int best = aMinLeng - 1;
   int best_pos = -1;
+  // A longer match must agree on the 4 bytes ending at the current best length.
+  uint32_t tail = load32(cur + best - 3);
   for (int j = *aHead; j >= lowest; j = aPrev[j & (kMaxOffset - 1)]) {
-    const unsigned char* cand = window_ + (j - base_);
-    // A longer match must agree on the 4 bytes ending at the current best length.
-    if (load32(cand + best - 3) != load32(cur + best - 3)) continue;
+    const unsigned char* cand = window + j;
+    if (load32(cand + best - 3) != tail) continue;
     const int leng = matchLeng(cand, cur, 0, aCap);
     if (leng > best) {
       best = leng;
       best_pos = j;
       if (leng == aCap) break;
+      tail = load32(cur + best - 3);
     }
   }
   if (best_pos < 0) return 0;
