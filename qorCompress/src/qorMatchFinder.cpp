@@ -84,16 +84,9 @@ void qorMatchFinder_t::setWindow(const unsigned char* aWindow, int aBase, int aL
   limit_ = aLimit;
 }
 
-void qorMatchFinder_t::insertRange(int aAbsCur) {
-  if (use8_) {
-    insertPositions<true>(aAbsCur);
-  } else {
-    insertPositions<false>(aAbsCur);
-  }
-}
-
+// Inlined into the searches: it runs between every two of them, mostly over a few positions.
 template <bool kUse8>
-void qorMatchFinder_t::insertPositions(int aAbsCur) {
+__attribute__((always_inline)) inline void qorMatchFinder_t::insertPositions(int aAbsCur) {
   int p = nextInsert_ > aAbsCur - kMaxOffset ? nextInsert_ : aAbsCur - kMaxOffset;
   nextInsert_ = aAbsCur;
   // Locals: stores into the tables would otherwise make the compiler reload the members.
@@ -149,13 +142,21 @@ void qorMatchFinder_t::insertPositions(int aAbsCur) {
   }
 }
 
+void qorMatchFinder_t::insertRange(int aAbsCur) {
+  if (use8_) {
+    insertPositions<true>(aAbsCur);
+  } else {
+    insertPositions<false>(aAbsCur);
+  }
+}
+
 int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
-  insertUpTo(base_ + aCur);
   return use8_ ? skipPositions<true>(aCur, aStop) : skipPositions<false>(aCur, aStop);
 }
 
 template <bool kUse8>
 int qorMatchFinder_t::skipPositions(int aCur, int aStop) {
+  if (nextInsert_ < base_ + aCur) insertPositions<kUse8>(base_ + aCur);
   const unsigned char* const window = window_ - base_;
   int* const head4 = head4_;
   int* const prev4 = prev4_;
