@@ -93,18 +93,19 @@ void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int
     // Steps until the next refill point cannot change the window.
     const int stop = srcRemain_ > 0 ? srcLimit_ - kRefillAt : srcLimit_;
     while (srcIndex_ < stop) {
-      const unsigned char* at = buffer_ + srcIndex_;
       // The skipper's own first test, here too to save a call where it fails.
-      if (srcLimit_ - srcIndex_ > 3 && qorMatchFinder_t::mayBeLiteral(at)) {
-        const int normal_stop = normalIndex_ + kMaxNormal;
-        const int next = finder.skipLiterals(srcIndex_, stop < normal_stop ? stop : normal_stop);
-        if (next != srcIndex_) {
-          srcIndex_ = next;
-          if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
-          continue;
-        }
+      if (srcLimit_ - srcIndex_ <= 3 || !qorMatchFinder_t::mayBeLiteral(buffer_ + srcIndex_)) {
+        step();
+        continue;
       }
-      step();
+      const int normal_stop = normalIndex_ + kMaxNormal;
+      const int skip_stop = stop < normal_stop ? stop : normal_stop;
+      srcIndex_ = finder.skipLiterals(srcIndex_, skip_stop);
+      if (srcIndex_ == skip_stop) {
+        if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
+      } else if (srcLimit_ - srcIndex_ > 3 && qorMatchFinder_t::mayBeLiteral(buffer_ + srcIndex_)) {
+        sdStep();
+      }
     }
   }
   flushNormalData();
@@ -174,14 +175,7 @@ void qorCompressor_t::step() {
       covered = rle;
       break;
     case kKindSd:
-      if (sdOffset_ > kNearMax) {
-        putDirective(kFarSd, sd);
-        putData(static_cast<unsigned char>(sdOffset_));
-        putData(static_cast<unsigned char>(sdOffset_ >> 8));
-      } else {
-        putDirective(kNearSd, sd);
-        putData(static_cast<unsigned char>(sdOffset_));
-      }
+      putSd(sd);
       covered = sd;
       break;
     default:
@@ -192,6 +186,33 @@ void qorCompressor_t::step() {
   }
   srcIndex_ += covered;
   normalIndex_ = srcIndex_;
+}
+
+// A step where the skipper stopped at a position that starts no zero, rle or word run (its
+// first test passed): only an sd match can be chosen, so the other measures are left out.
+void qorCompressor_t::sdStep() {
+  const unsigned char* cur = buffer_ + srcIndex_;
+  const int sd = getSdLeng(cur[1] == cur[0] ? 2 : 1, minSdLeng(0, 0));
+  if (sd > 0 && sdScore(sd) - (sdOffset_ > kNearMax ? 1 : 0) > 0) {
+    flushNormalData();
+    putSd(sd);
+    srcIndex_ += sd;
+    normalIndex_ = srcIndex_;
+    return;
+  }
+  ++srcIndex_;
+  if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
+}
+
+inline void qorCompressor_t::putSd(int leng) {
+  if (sdOffset_ > kNearMax) {
+    putDirective(kFarSd, leng);
+    putData(static_cast<unsigned char>(sdOffset_));
+    putData(static_cast<unsigned char>(sdOffset_ >> 8));
+  } else {
+    putDirective(kNearSd, leng);
+    putData(static_cast<unsigned char>(sdOffset_));
+  }
 }
 
 // Bytes equal to the one at srcIndex_ from there on, at most kRunProbe.

@@ -26,6 +26,7 @@ class qorCompressor_t {
 
   void refill(PortStream_t& srcStrm);
   void step();
+  void sdStep();
   int runLeng();      // bytes equal to the current one, from it on; the measures share it
   int longRunLeng();
   int getZeroLeng(int run);
@@ -35,6 +36,7 @@ class qorCompressor_t {
   int wordWalk();
   void putData(unsigned char d);
   void putDirective(unsigned char directive, int leng);
+  void putSd(int leng);
   void putBuff(const void* buff, int leng);
   void flushDstBuff();
   void flushNormalData();
