@@ -343,6 +343,39 @@ TEST(qorExpander, ShortDirectivesAroundTheOutputBlockEnd) {
   }
 }
 
+// Directives that end just before, at and just after the end of the first payload read
+// (256 KiB and one longest directive), and that straddle it, short and long.
+TEST(qorExpander, DirectivesAroundThePayloadRefill) {
+  const int kFirstRead = 0x40000 + 3 + 0xFFFF;
+  std::mt19937 rng(11);
+  std::string bytes;
+  for (int i = 0; i < 0xFFFF; ++i) bytes += static_cast<char>(rng());
+  for (int kind = 0; kind < 3; ++kind) {
+    for (int shift = -2; shift <= 2; ++shift) {
+      PayloadBuilder_t b;
+      const int tested = kind == 0 ? 32 : kind == 1 ? 5 : 3 + 5000;  // payload bytes
+      for (;;) {
+        const int left = kFirstRead + shift - tested - static_cast<int>(b.payload.size());
+        if (left <= 50000) {
+          b.Normal(bytes.substr(0, left - 3));
+          break;
+        }
+        b.Normal(bytes.substr(0, 40000));
+      }
+      if (kind == 0) b.Normal(bytes.substr(7, 31));
+      if (kind == 1) b.Copy(1000, 40, true);
+      if (kind == 2) b.Normal(bytes.substr(3, 5000));
+      ASSERT_EQ(static_cast<size_t>(kFirstRead + shift), b.payload.size());
+      while (b.payload.size() < static_cast<size_t>(kFirstRead) + 2000) b.Random(rng);
+      b.payload += '\xFF';
+      const int real_size = static_cast<int>(b.expanded.size());
+      ASSERT_TRUE(b.expanded == ExpandString(b.payload, real_size)) << kind << " " << shift;
+      const std::string cut = b.payload.substr(0, kFirstRead + shift - 1);
+      ASSERT_EQ(kInvalid, ExpandError(cut, real_size)) << kind << " " << shift;
+    }
+  }
+}
+
 // Random directive streams, also of forms the encoder never writes, whole and damaged: the
 // expander accepts exactly what the plain byte-by-byte reading accepts, with the same bytes.
 TEST(qorExpander, AgreesWithPlainExpansionOnRandomPayloads) {

@@ -51,6 +51,30 @@ inline void fill(unsigned char* aDst, unsigned char aValue, int aLeng) {
   std::memset(aDst, aValue, aLeng <= kShort ? kShort : aLeng);
 }
 
+// Spreads aLeng low bytes into 16-bit little-endian units. The buffers are distinct, which
+// lets the compiler vectorise the loop.
+inline void spreadWords(unsigned char* __restrict aDst, const unsigned char* __restrict aSrc,
+                        int aLeng) {
+  for (int k = 0; k < aLeng; ++k) {
+    aDst[2 * k] = aSrc[k];
+    aDst[2 * k + 1] = 0;
+  }
+}
+
+// Payload bytes the directive at aIn takes; more than the bytes left when its length is cut.
+int64_t directiveSize(const unsigned char* aIn, const unsigned char* aEnd) {
+  if (aEnd - aIn < 3) return 3;
+  const int code = aIn[0] >> 5;
+  int leng = aIn[0] & 0x1F;
+  int head = 1;
+  if (leng == 0) {
+    leng = aIn[1] | aIn[2] << 8;
+    head = 3;
+  }
+  const int operand[] = {leng, 0, 1, 1, 2, leng, 0, 0};
+  return head + operand[code];
+}
+
 // Expands the directive at `in` with every check; returns false at the end mark. `produced`
 // counts the bytes before `out`; the buffer keeps kHistory of them before `out`.
 bool checkedDirective(const unsigned char*& in, const unsigned char* in_end, unsigned char*& out,
@@ -93,10 +117,7 @@ bool checkedDirective(const unsigned char*& in, const unsigned char* in_end, uns
     }
     case 5:
       if (avail < leng) invalid();
-      for (int k = 0; k < leng; ++k) {
-        out[2 * k] = in[k];
-        out[2 * k + 1] = 0;
-      }
+      spreadWords(out, in, leng);
       in += leng;
       break;
     default:
@@ -242,15 +263,6 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
   unsigned char* out_flushed = out_start;  // bytes before it have gone to dstStrm
   int64_t out_total = 0;                   // bytes expanded before out_start
   for (;;) {
-    if (in_end - in < kMaxDirective && in_remain > 0) {
-      const int kept = static_cast<int>(in_end - in);
-      std::memmove(in_buf.p, in, kept);
-      const int count = in_size - kept < in_remain ? in_size - kept : in_remain;
-      srcStrm.ReadBuffer(in_buf.p + kept, count);
-      in_remain -= count;
-      in = in_buf.p;
-      in_end = in_buf.p + kept + count;
-    }
     if (out - out_start >= kOutBlock) {
       dstStrm.WriteBuffer(out_flushed, static_cast<int>(out - out_flushed));
       std::memmove(out_buf.p, out - kHistory, kHistory);
@@ -263,6 +275,16 @@ void qorExpander_t::expand(PortStream_t& dstStrm, PortStream_t& srcStrm, int pay
       in = fastRun(in, in_end - kShort, out, out_start + room);
     }
 #endif
+    // Refilled only when the directive is not whole in the buffer, so that little is moved.
+    if (in_remain > 0 && (in_end - in <= kShort || directiveSize(in, in_end) > in_end - in)) {
+      const int kept = static_cast<int>(in_end - in);
+      std::memmove(in_buf.p, in, kept);
+      const int count = in_size - kept < in_remain ? in_size - kept : in_remain;
+      srcStrm.ReadBuffer(in_buf.p + kept, count);
+      in_remain -= count;
+      in = in_buf.p;
+      in_end = in_buf.p + kept + count;
+    }
     const int64_t produced = out_total + (out - out_start);
     if (!checkedDirective(in, in_end, out, produced, realSize)) break;
   }
