@@ -100,9 +100,14 @@ void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int
       }
       const int normal_stop = normalIndex_ + kMaxNormal;
       const int skip_stop = stop < normal_stop ? stop : normal_stop;
-      srcIndex_ = finder.skipLiterals(srcIndex_, skip_stop);
+      int near_offset;
+      srcIndex_ = finder.skipLiterals(srcIndex_, skip_stop, near_offset);
       if (srcIndex_ == skip_stop) {
         if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
+      } else if (near_offset > 0) {
+        // The skipper has done the search: the nearest 3 bytes within 255 and nothing longer.
+        sdOffset_ = near_offset;
+        putSdStep(3);
       } else if (srcLimit_ - srcIndex_ > 3 && qorMatchFinder_t::mayBeLiteral(buffer_ + srcIndex_)) {
         sdStep();
       }
@@ -194,14 +199,19 @@ void qorCompressor_t::sdStep() {
   const unsigned char* cur = buffer_ + srcIndex_;
   const int sd = getSdLeng(cur[1] == cur[0] ? 2 : 1, minSdLeng(0, 0));
   if (sd > 0 && sdScore(sd) - (sdOffset_ > kNearMax ? 1 : 0) > 0) {
-    flushNormalData();
-    putSd(sd);
-    srcIndex_ += sd;
-    normalIndex_ = srcIndex_;
+    putSdStep(sd);
     return;
   }
   ++srcIndex_;
   if (srcIndex_ - normalIndex_ >= kMaxNormal) flushNormalData();
+}
+
+// Writes the sd directive that the step at srcIndex_ chose, after the pending normal run.
+inline void qorCompressor_t::putSdStep(int leng) {
+  flushNormalData();
+  putSd(leng);
+  srcIndex_ += leng;
+  normalIndex_ = srcIndex_;
 }
 
 inline void qorCompressor_t::putSd(int leng) {

@@ -37,6 +37,7 @@ class qorCompressor_t {
   void putData(unsigned char d);
   void putDirective(unsigned char directive, int leng);
   void putSd(int leng);
+  void putSdStep(int leng);
   void putBuff(const void* buff, int leng);
   void flushDstBuff();
   void flushNormalData();

@@ -150,12 +150,14 @@ void qorMatchFinder_t::insertRange(int aAbsCur) {
   }
 }
 
-int qorMatchFinder_t::skipLiterals(int aCur, int aStop) {
-  return use8_ ? skipPositions<true>(aCur, aStop) : skipPositions<false>(aCur, aStop);
+int qorMatchFinder_t::skipLiterals(int aCur, int aStop, int& aNearOffset) {
+  aNearOffset = 0;
+  return use8_ ? skipPositions<true>(aCur, aStop, aNearOffset)
+               : skipPositions<false>(aCur, aStop, aNearOffset);
 }
 
 template <bool kUse8>
-int qorMatchFinder_t::skipPositions(int aCur, int aStop) {
+int qorMatchFinder_t::skipPositions(int aCur, int aStop, int& aNearOffset) {
   if (nextInsert_ < base_ + aCur) insertPositions<kUse8>(base_ + aCur);
   const unsigned char* const window = window_ - base_;
   int* const head4 = head4_;
@@ -183,7 +185,10 @@ int qorMatchFinder_t::skipPositions(int aCur, int aStop) {
     while (k >= abs - kNearMax && (load32(window + k) & 0xFFFFFF) != (v & 0xFFFFFF)) {
       k = prev3[k & kNearMax];
     }
-    if (k >= abs - kNearMax) break;
+    if (k >= abs - kNearMax) {
+      aNearOffset = abs - k;
+      break;
+    }
     prev4[abs & (kMaxOffset - 1)] = head4[h4];
     head4[h4] = abs;
     prev3[abs & kNearMax] = head3[h3];

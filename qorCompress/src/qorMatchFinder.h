@@ -28,8 +28,10 @@ class qorMatchFinder_t {
 
   // Passes over the positions from aCur (below aStop) that are sure literals: no zero, rle
   // or word candidate, no match of 4 within 1024 and no match of 3 within 255 (so none that
-  // scores). Returns the first position it cannot decide; find() takes over from there.
-  int skipLiterals(int aCur, int aStop);
+  // scores). Returns the first position it cannot decide; find() takes over from there,
+  // except when that position has no match of 4 or more but one of 3 within 255: then
+  // aNearOffset is the offset of the nearest such (what find() would return), else 0.
+  int skipLiterals(int aCur, int aStop, int& aNearOffset);
 
   // False when the 4 bytes from aAt start a zero run, an rle run or a word run of 2 units:
   // then the position is no literal.
@@ -52,7 +54,7 @@ class qorMatchFinder_t {
   }
   void insertRange(int aAbsCur);
   template <bool kUse8> void insertPositions(int aAbsCur);
-  template <bool kUse8> int skipPositions(int aCur, int aStop);
+  template <bool kUse8> int skipPositions(int aCur, int aStop, int& aNearOffset);
   void addRun(const unsigned char* aLast, int aAbsEnd);
   int matchLeng(const unsigned char* aA, const unsigned char* aB, int aFrom, int aCap) const;
   int findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, int& aOffset);
