@@ -274,26 +274,29 @@ inline int qorMatchFinder_t::matchLeng(const unsigned char* aA, const unsigned c
 int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, int& aOffset) {
   if (aRunLeng >= aCap) return 0;
   const unsigned char* cur = window_ + aCur;
+  const unsigned char* const window = window_ - base_;  // indexed by absolute offsets
   const int abs_cur = base_ + aCur;
   const int key = cur[0] << 8 | cur[aRunLeng];
   const int lowest = abs_cur - kMaxOffset;
-  int best = aMinLeng - 1;
+  const int oldest = runCount_ - kRunRing;
+  int best = aMinLeng - 1;  // at least aRunLeng, so the tail below lies within the match
   int best_pos = -1;
-  for (int i = headRun_[hashOf(static_cast<uint32_t>(key), kBits3)];
-       i >= 0 && i >= runCount_ - kRunRing;) {
+  uint32_t tail = load32(cur + best - 3);
+  for (int i = headRun_[hashOf(static_cast<uint32_t>(key), kBits3)]; i >= 0 && i >= oldest;) {
     const Run_t& run = runs_[i & (kRunRing - 1)];
     const int j = run.end - aRunLeng;
     if (j < lowest) break;
     i = run.prev;
     // A run is listed as soon as its end is in the window: the one at aCur itself may be.
     if (run.key != key || run.leng < aRunLeng || j >= abs_cur) continue;
-    const unsigned char* cand = window_ + (j - base_);
-    if (cand[best] != cur[best]) continue;
+    const unsigned char* cand = window + j;
+    if (load32(cand + best - 3) != tail) continue;
     const int leng = matchLeng(cand, cur, aRunLeng + 1, aCap);
     if (leng > best) {
       best = leng;
       best_pos = j;
       if (leng == aCap) break;
+      tail = load32(cur + best - 3);
     }
   }
   if (best_pos < 0) return 0;
