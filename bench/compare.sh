@@ -4,13 +4,14 @@
 # against gzip -1, lz4 -1 and zstd -1 on CORPUS_DIR/freedoom2.wad and CORPUS_DIR/utf16.txt
 # (../shared/bench/make-corpus.sh builds them). One table from one run on this machine: MB/s
 # of input (1 MB = 10^6 bytes) from the median wall-clock time and from the median CPU time
-# of RUNS runs (default 5), and the compression ratio (input size / output size).
+# of RUNS runs (default 5), and the compression ratio (input size / output size). BUILD names
+# the build tree to use (default build-bench).
 set -euo pipefail
 
 corpus=$(cd "${1:?usage: bench/compare.sh CORPUS_DIR}" && pwd)
 runs=${RUNS:-5}
 root=$(cd "$(dirname "$0")/.." && pwd)
-build=$root/build-bench
+build=${BUILD:-$root/build-bench}
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 

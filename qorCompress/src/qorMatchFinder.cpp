@@ -282,6 +282,7 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
   int best = aMinLeng - 1;  // at least aRunLeng, so the tail below lies within the match
   int best_pos = -1;
   uint32_t tail = load32(cur + best - 3);
+  const unsigned char* tails = window + best - 3;  // tails[j]: where candidate j has them
   for (int i = headRun_[hashOf(static_cast<uint32_t>(key), kBits3)]; i >= 0 && i >= oldest;) {
     const Run_t& run = runs_[i & (kRunRing - 1)];
     const int j = run.end - aRunLeng;
@@ -289,14 +290,14 @@ int qorMatchFinder_t::findRun(int aCur, int aRunLeng, int aMinLeng, int aCap, in
     i = run.prev;
     // A run is listed as soon as its end is in the window: the one at aCur itself may be.
     if (run.key != key || run.leng < aRunLeng || j >= abs_cur) continue;
-    const unsigned char* cand = window + j;
-    if (load32(cand + best - 3) != tail) continue;
-    const int leng = matchLeng(cand, cur, aRunLeng + 1, aCap);
+    if (load32(tails + j) != tail) continue;
+    const int leng = matchLeng(window + j, cur, aRunLeng + 1, aCap);
     if (leng > best) {
       best = leng;
       best_pos = j;
       if (leng == aCap) break;
       tail = load32(cur + best - 3);
+      tails = window + best - 3;
     }
   }
   if (best_pos < 0) return 0;
@@ -314,15 +315,16 @@ inline int qorMatchFinder_t::findChain(const int* aHead, const int* aPrev, int a
   int best_pos = -1;
   // A longer match must agree on the 4 bytes ending at the current best length.
   uint32_t tail = load32(cur + best - 3);
+  const unsigned char* tails = window + best - 3;  // tails[j]: where candidate j has them
   for (int j = *aHead; j >= lowest; j = aPrev[j & (kMaxOffset - 1)]) {
-    const unsigned char* cand = window + j;
-    if (load32(cand + best - 3) != tail) continue;
-    const int leng = matchLeng(cand, cur, 0, aCap);
+    if (load32(tails + j) != tail) continue;
+    const int leng = matchLeng(window + j, cur, 0, aCap);
     if (leng > best) {
       best = leng;
       best_pos = j;
       if (leng == aCap) break;
       tail = load32(cur + best - 3);
+      tails = window + best - 3;
     }
   }
   if (best_pos < 0) return 0;
