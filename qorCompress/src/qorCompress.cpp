@@ -108,7 +108,7 @@ void qorCompressor_t::compress(PortStream_t& dstStrm, PortStream_t& srcStrm, int
         // The skipper has done the search: the nearest 3 bytes within 255 and nothing longer.
         sdOffset_ = near_offset;
         putSdStep(3);
-      } else if (srcLimit_ - srcIndex_ > 3 && qorMatchFinder_t::mayBeLiteral(buffer_ + srcIndex_)) {
+      } else if (near_offset < 0) {
         sdStep();
       }
     }
@@ -193,8 +193,8 @@ void qorCompressor_t::step() {
   normalIndex_ = srcIndex_;
 }
 
-// A step where the skipper stopped at a position that starts no zero, rle or word run (its
-// first test passed): only an sd match can be chosen, so the other measures are left out.
+// A step where the skipper stopped at a match of 4 or more at a position that starts no
+// zero, rle or word run: only an sd match can be chosen, so the other measures are left out.
 void qorCompressor_t::sdStep() {
   const unsigned char* cur = buffer_ + srcIndex_;
   const int sd = getSdLeng(cur[1] == cur[0] ? 2 : 1, minSdLeng(0, 0));

@@ -180,7 +180,10 @@ int qorMatchFinder_t::skipPositions(int aCur, int aStop, int& aNearOffset) {
     const int h3 = hashOf(v & 0xFFFFFF, bits3);
     int j = head4[h4];
     while (j >= abs - kMaxOffset && load32(window + j) != v) j = prev4[j & (kMaxOffset - 1)];
-    if (j >= abs - kMaxOffset) break;
+    if (j >= abs - kMaxOffset) {
+      aNearOffset = -1;
+      break;
+    }
     int k = head3[h3];
     while (k >= abs - kNearMax && (load32(window + k) & 0xFFFFFF) != (v & 0xFFFFFF)) {
       k = prev3[k & kNearMax];

@@ -30,7 +30,8 @@ class qorMatchFinder_t {
   // or word candidate, no match of 4 within 1024 and no match of 3 within 255 (so none that
   // scores). Returns the first position it cannot decide; find() takes over from there,
   // except when that position has no match of 4 or more but one of 3 within 255: then
-  // aNearOffset is the offset of the nearest such (what find() would return), else 0.
+  // aNearOffset is the offset of the nearest such (what find() would return). It is -1 when
+  // the position has a match of 4 or more (and no zero, rle or word candidate), else 0.
   int skipLiterals(int aCur, int aStop, int& aNearOffset);
 
   // False when the 4 bytes from aAt start a zero run, an rle run or a word run of 2 units:
