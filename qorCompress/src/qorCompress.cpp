@@ -348,7 +348,7 @@ void qorCompressor_t::flushDstBuff() {
   }
 }
 
-void qorCompressor_t::flushNormalData() {
+inline void qorCompressor_t::flushNormalData() {
   const int leng = srcIndex_ - normalIndex_;
   if (leng <= 0) return;
   // Most runs are short: with room on both sides, one fixed-size copy (the bytes past the
