@@ -229,6 +229,8 @@ __attribute__((target("ssse3"))) const unsigned char* fastRun(const unsigned cha
   return in;
 }
 
+// Initialised after kFast: an expand() run before either (from another static initialiser)
+// sees false and takes the checked path only.
 const bool kHaveShuffle = [] {
   __builtin_cpu_init();
   return __builtin_cpu_supports("ssse3") != 0;
