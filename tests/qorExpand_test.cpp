@@ -142,16 +142,19 @@ bool PlainExpand(const std::string& aPayload, int aRealSize, std::string& aOut) 
       if (leng == 0) return false;
     }
     const int code = directive >> 5;
-    const size_t operand = code == 0 || code == 5 ? leng : code == 2 || code == 3 ? 1 : code == 4 ? 2 : 0;
+    const bool is_sd = code == 3 || code == 4;
+    const size_t operand =
+        code == 0 || code == 5 ? leng : code == 2 || code == 3 ? 1 : code == 4 ? 2 : 0;
     if (code > 5 || !take(operand)) return false;
     const int offset = code == 3 ? byte(i) : code == 4 ? byte(i) | byte(i + 1) << 8 : 0;
-    if (code >= 3 && code <= 4 && (offset == 0 || offset > 1024 || offset > static_cast<int>(aOut.size())))
+    if (is_sd && (offset == 0 || offset > 1024 || offset > static_cast<int>(aOut.size()))) {
       return false;
+    }
     for (int k = 0; k < leng; ++k) {
       if (code == 0 || code == 5) aOut += aPayload[i + k];
       if (code == 1 || code == 5) aOut += '\0';
       if (code == 2) aOut += aPayload[i];
-      if (code >= 3 && code <= 4) aOut += aOut[aOut.size() - offset];
+      if (is_sd) aOut += aOut[aOut.size() - offset];
     }
     i += operand;
     if (aOut.size() > static_cast<size_t>(aRealSize)) return false;
@@ -336,8 +339,10 @@ TEST(qorExpander, ShortDirectivesAroundTheOutputBlockEnd) {
         for (int i = 0; i < 20; ++i) b.Random(rng);
         b.payload += '\xFF';
         const int real_size = static_cast<int>(b.expanded.size());
-        ASSERT_TRUE(b.expanded == ExpandString(b.payload, real_size)) << kind << " " << leng << " " << shift;
-        ASSERT_EQ(kInvalid, ExpandError(b.payload, real_size - 1)) << kind << " " << leng << " " << shift;
+        const std::string what = std::to_string(kind) + " " + std::to_string(leng) + " " +
+                                 std::to_string(shift);
+        ASSERT_TRUE(b.expanded == ExpandString(b.payload, real_size)) << what;
+        ASSERT_EQ(kInvalid, ExpandError(b.payload, real_size - 1)) << what;
       }
     }
   }
