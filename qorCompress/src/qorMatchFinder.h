@@ -9,7 +9,7 @@
 
 class qorMatchFinder_t {
  public:
-  // Allocates the tables (about 45 KB); the destructor releases them.
+  // Allocates the tables (about 65 KB); the destructor releases them.
   qorMatchFinder_t();
   ~qorMatchFinder_t();
   qorMatchFinder_t(const qorMatchFinder_t&) = delete;
@@ -81,7 +81,7 @@ class qorMatchFinder_t {
   Run_t runs_[kRunRing];  // ring of the runs listed last
   int runCount_;
   bool use8_;     // the 8-byte chains hold every eligible position of the last 1024
-  unsigned searches_;
+  unsigned searches_;  // searches that could use the 8-byte chains (cap of 8 or more)
   int sampled_;   // 4-byte chain entries counted since the last decision
 };
 
