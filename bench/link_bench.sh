@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # link_bench.sh CORPUS_DIR: times linking CORPUS_DIR/freedoom.ls with qorLink against tar on
 # the same files (stored) and against the compressor alone on the same bytes (compressed),
-# and measures the link's peak memory. Best of RUNS wall-clock runs (default 5).
+# and measures the link's peak memory. Median of RUNS wall-clock runs (default 5).
 # Targets: stored link <= 2 x tar -cf; compressed link <= 1.2 x compressor;
 # peak memory < largest compressed entry + 16 MB.
 set -euo pipefail
@@ -23,23 +23,22 @@ grep -v '^[;%]' "$corpus/freedoom.ls" > "$work/files"
 
 calc() { awk "BEGIN { print ($1) }"; }
 
-# Best wall-clock seconds of $runs runs of the command, run in the corpus directory.
-best() {
-  local best_s="" start end s
+# Median wall-clock seconds of $runs runs of the command, run in the corpus directory.
+median() {
+  local times=() start end
   for _ in $(seq "$runs"); do
     start=$(date +%s.%N)
     (cd "$corpus" && "$@" >/dev/null)
     end=$(date +%s.%N)
-    s=$(calc "$end - $start")
-    if [ -z "$best_s" ] || [ "$(calc "$s < $best_s")" = 1 ]; then best_s=$s; fi
+    times+=("$(calc "$end - $start")")
   done
-  printf '%.3f' "$best_s"
+  printf '%s\n' "${times[@]}" | sort -g | awk '{ t[NR] = $1 } END { printf "%.3f", t[int((NR + 1) / 2)] }'
 }
 
-tar_s=$(best tar -cf "$work/all.tar" -T "$work/files")
-stored_s=$(best "$build/qorLink" "$work/stored.ls" -o "$work/stored.LB")
-compressor_s=$(best "$work/compress_list" "$work/files")
-compressed_s=$(best "$build/qorLink" freedoom.ls -o "$work/compressed.LB")
+tar_s=$(median tar -cf "$work/all.tar" -T "$work/files")
+stored_s=$(median "$build/qorLink" "$work/stored.ls" -o "$work/stored.LB")
+compressor_s=$(median "$work/compress_list" "$work/files")
+compressed_s=$(median "$build/qorLink" freedoom.ls -o "$work/compressed.LB")
 
 summary=$(cd "$corpus" && "$work/compress_list" "$work/files")
 largest=$(echo "$summary" | sed 's/.*largest payload \([0-9]*\) bytes.*/\1/')
