@@ -2,7 +2,7 @@
 # unpack_bench.sh CORPUS_DIR: links CORPUS_DIR/freedoom.ls (compressed, name blocks), then
 # times `qorUnpack test` on the archive and `qorUnpack extract` against `tar -xf` of the
 # same files, and checks that the extracted response file relinks the archive byte for byte.
-# Best of RUNS wall-clock runs (default 5); every extraction goes into a fresh directory.
+# Median of RUNS wall-clock runs (default 5); every extraction goes into a fresh directory.
 # Targets: test >= 300 MB/s of expanded data; extract >= half the speed of tar -xf. Extract is
 # timed as it is by default (every compressed body recompressed to prove the relink exact)
 # and with --no-verify.
@@ -32,7 +32,7 @@ timed() {
   end=$(date +%s.%N)
   calc "$end - $start"
 }
-min() { if [ -z "$1" ] || [ "$(calc "$2 < $1")" = 1 ]; then echo "$2"; else echo "$1"; fi; }
+median() { printf '%s\n' "$@" | sort -g | awk '{ t[NR] = $1 } END { print t[int((NR + 1) / 2)] }'; }
 
 expanded=$("$build/qorUnpack" test "$work/freedoom.LB" | sed 's/.* entries, \([0-9]*\) bytes expanded.*/\1/')
 "$build/qorUnpack" extract "$work/freedoom.LB" -C "$work/x" >/dev/null
@@ -41,13 +41,15 @@ cmp -s "$work/freedoom.LB" "$work/x/freedoom.LB" && roundtrip=identical || round
 (cd "$work/x" && rm freedoom.ls freedoom.LB && tar -cf "$work/files.tar" .)
 
 # Interleaved, so that every command meets the same state of the machine and file system.
-test_s="" tar_s="" extract_s="" fast_s=""
+tests=() tars=() extracts=() fasts=()
 for _ in $(seq "$runs"); do
-  test_s=$(min "$test_s" "$(timed "$build/qorUnpack" test "$work/freedoom.LB")")
-  tar_s=$(min "$tar_s" "$(timed tar -xf "$work/files.tar" -C {})")
-  extract_s=$(min "$extract_s" "$(timed "$build/qorUnpack" extract "$work/freedoom.LB" -C {})")
-  fast_s=$(min "$fast_s" "$(timed "$build/qorUnpack" extract --no-verify "$work/freedoom.LB" -C {})")
+  tests+=("$(timed "$build/qorUnpack" test "$work/freedoom.LB")")
+  tars+=("$(timed tar -xf "$work/files.tar" -C {})")
+  extracts+=("$(timed "$build/qorUnpack" extract "$work/freedoom.LB" -C {})")
+  fasts+=("$(timed "$build/qorUnpack" extract --no-verify "$work/freedoom.LB" -C {})")
 done
+test_s=$(median "${tests[@]}") tar_s=$(median "${tars[@]}")
+extract_s=$(median "${extracts[@]}") fast_s=$(median "${fasts[@]}")
 
 verdict() { if [ "$(calc "$1")" = 1 ]; then echo met; else echo MISSED; fi; }
 test_mbs=$(calc "$expanded / $test_s / 1e6")
