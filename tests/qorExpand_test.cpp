@@ -10,6 +10,7 @@
 #include "qorCompress/src/qorCompress.h"
 #include "tests/support/payloadrun.h"
 #include "tests/support/raisedtext.h"
+#include "tests/support/referenceexpander.h"
 #include "tests/support/teststream.h"
 
 namespace {
@@ -123,49 +124,10 @@ struct PayloadBuilder_t {
   }
 };
 
-// Expands byte by byte as the format describes, or returns false for a malformed payload.
-bool PlainExpand(const std::string& aPayload, int aRealSize, std::string& aOut) {
-  aOut.clear();
-  size_t i = 0;
-  const auto take = [&](size_t n) { return i + n <= aPayload.size(); };
-  const auto byte = [&](size_t k) { return static_cast<unsigned char>(aPayload[k]); };
-  if (aPayload.empty()) return aRealSize == 0;
-  for (;;) {
-    if (!take(1)) return false;
-    const int directive = byte(i++);
-    if (directive == 0xFF) break;
-    int leng = directive & 0x1F;
-    if (leng == 0) {
-      if (!take(2)) return false;
-      leng = byte(i) | byte(i + 1) << 8;
-      i += 2;
-      if (leng == 0) return false;
-    }
-    const int code = directive >> 5;
-    const bool is_sd = code == 3 || code == 4;
-    const size_t operand =
-        code == 0 || code == 5 ? leng : code == 2 || code == 3 ? 1 : code == 4 ? 2 : 0;
-    if (code > 5 || !take(operand)) return false;
-    const int offset = code == 3 ? byte(i) : code == 4 ? byte(i) | byte(i + 1) << 8 : 0;
-    if (is_sd && (offset == 0 || offset > 1024 || offset > static_cast<int>(aOut.size()))) {
-      return false;
-    }
-    for (int k = 0; k < leng; ++k) {
-      if (code == 0 || code == 5) aOut += aPayload[i + k];
-      if (code == 1 || code == 5) aOut += '\0';
-      if (code == 2) aOut += aPayload[i];
-      if (is_sd) aOut += aOut[aOut.size() - offset];
-    }
-    i += operand;
-    if (aOut.size() > static_cast<size_t>(aRealSize)) return false;
-  }
-  return i == aPayload.size() && aOut.size() == static_cast<size_t>(aRealSize);
-}
-
-// The expander's verdict and output against PlainExpand's.
+// The expander's verdict and output against ReferenceExpand's.
 void ExpectSameAsPlain(const std::string& aPayload, int aRealSize, const std::string& aWhat) {
   std::string plain;
-  if (PlainExpand(aPayload, aRealSize, plain)) {
+  if (ReferenceExpand(aPayload, aRealSize, plain)) {
     ASSERT_TRUE(plain == ExpandString(aPayload, aRealSize)) << aWhat;
   } else {
     ASSERT_EQ(kInvalid, ExpandError(aPayload, aRealSize)) << aWhat;
